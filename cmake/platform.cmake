@@ -1,0 +1,10 @@
+# The target `tuvo_platform`: what the library and the programs link for the platform's interfaces.
+if(TUVOSHARING_PLATFORM)
+  list(POP_FRONT TUVOSHARING_PLATFORM platform_link)
+  add_library(tuvo_platform INTERFACE)
+  target_link_libraries(tuvo_platform INTERFACE "${platform_link}")
+  target_include_directories(tuvo_platform SYSTEM INTERFACE ${TUVOSHARING_PLATFORM})
+else()
+  add_subdirectory(platform)
+  add_library(tuvo_platform ALIAS tuvoplatform)
+endif()

@@ -1,0 +1,101 @@
+// The connection: opening, running texts of statements, error texts, closing.
+#include <sqlite3.h>
+#include <tuvoplatform/database.h>
+
+#include <exception>
+#include <memory>
+#include <new>
+#include <string>
+
+#include "database_result.h"
+#include "database_statement.h"
+
+namespace {
+
+// What a TUVODB handle really is.
+struct Connection : TUVODB_tag {
+  Connection() : TUVODB_tag{} {}
+  // close_v2: a statement that the caller prepared on `sqlite` may still be there; the connection
+  // then ends with it instead of staying open for good.
+  ~Connection() { sqlite3_close_v2(sqlite); }
+  Connection(const Connection&) = delete;
+  Connection& operator=(const Connection&) = delete;
+
+  std::string error;
+};
+
+// Short enough to need no memory of its own in a std::string.
+constexpr char kNoMemory[] = "out of memory";
+
+// Runs all statements of `sql`. On a failure its text is in `connection->error`.
+bool RunAll(Connection* connection, const char* sql, std::unique_ptr<DBResult_tag>* rows) {
+  try {
+    while (*sql != '\0') {
+      if (tuvo_platform::RunStatement(connection->sqlite, sql, &sql, rows) != SQLITE_OK) {
+        connection->error = sqlite3_errmsg(connection->sqlite);
+        return false;
+      }
+    }
+    return true;
+  } catch (const std::exception&) {  // the rows, or the error's text, do not fit
+    connection->error = kNoMemory;
+    return false;
+  }
+}
+
+void RollBackIfOpen(sqlite3* sqlite) {
+  if (sqlite3_get_autocommit(sqlite) == 0) {
+    sqlite3_exec(sqlite, "ROLLBACK", nullptr, nullptr, nullptr);
+  }
+}
+
+}  // namespace
+
+TUVODB* TUVODBConnect(const char* /*host*/, const char* /*user*/, const char* /*password*/,
+                      const char* path) {
+  if (path == nullptr || *path == '\0') {  // SQLite would make a nameless temporary database
+    return nullptr;
+  }
+  std::unique_ptr<Connection> connection(new (std::nothrow) Connection());
+  if (connection == nullptr ||
+      sqlite3_open_v2(path, &connection->sqlite, SQLITE_OPEN_READWRITE | SQLITE_OPEN_CREATE,
+                      nullptr) != SQLITE_OK ||
+      tuvo_platform::SetBusyWait(connection->sqlite) != SQLITE_OK) {
+    return nullptr;
+  }
+  return connection.release();
+}
+
+int TUVODBExecute(TUVODB* db, const char* sql, DBResult_tag** result) {
+  if (result != nullptr) {
+    *result = nullptr;
+  }
+  if (db == nullptr) {
+    return -1;
+  }
+  auto* connection = static_cast<Connection*>(db);
+  if (sql == nullptr) {
+    connection->error = "no text";
+    return -1;
+  }
+  const bool callers_transaction = sqlite3_get_autocommit(db->sqlite) == 0;
+  std::unique_ptr<DBResult_tag> rows;
+  if (!RunAll(connection, sql, &rows)) {
+    if (!callers_transaction) {
+      RollBackIfOpen(db->sqlite);
+    }
+    return -1;
+  }
+  if (result != nullptr) {
+    *result = rows.release();
+  }
+  return 0;
+}
+
+const char* TUVODBErrorGet(TUVODB* db) {
+  return db != nullptr ? static_cast<Connection*>(db)->error.c_str() : "not connected";
+}
+
+void TUVODBClose(TUVODB* db) {
+  delete static_cast<Connection*>(db);
+}

@@ -1,0 +1,76 @@
+# To be sourced. install_packages: makes sure that everything that the build, the tests and the
+# demonstration need is on this machine, as packages of Debian 12; nothing else is ever installed.
+# Quick, and without need of root or a network, when nothing is missing.
+
+# One package a line, and the reason for it.
+tuvo_packages() {
+  sed 's/ *#.*//' <<'LIST'
+g++                 # the compiler
+cmake               # configures the build
+ninja-build         # runs it
+pkg-config          # tells where the libraries are
+libsqlite3-dev      # the database
+libjsoncpp-dev      # JSON in the "data" column and in the records' JSON form
+libgcrypt20-dev     # salted SHA-1 of link passwords
+libssl-dev          # MD5 of link passwords
+libpam0g-dev        # account logins
+libcgicc-dev        # request parameters of the CGI programs
+libgtest-dev        # the tests
+clang-format        # the test of the sources' format
+python3             # the test of the folders' order
+strace              # tests: which system calls are made, and what happens when one fails
+sqlite3             # tests look into the database from outside
+openssl             # passwords of the tests' private accounts
+util-linux          # unshare: the private mount namespace that tests and demonstration run in
+mount               # lays that namespace out
+lighttpd            # the web server of the demonstration
+curl                # the visitor's browser there
+LIST
+}
+
+# install_packages: returns 0 when everything is there, else says why not and returns 1.
+install_packages() {
+  if ! command -v apt-get >/dev/null || ! command -v dpkg-query >/dev/null; then
+    echo "This is no Debian system: install the counterparts of these packages yourself:" >&2
+    tuvo_packages | sed 's/^/  /' >&2
+    return 1
+  fi
+  local missing
+  missing=$(tuvo_missing_packages)
+  [ -z "$missing" ] && return 0
+  if [ "$(id -u)" -ne 0 ]; then
+    echo "These packages are missing, and installing them needs root (sudo):" $missing >&2
+    return 1
+  fi
+  echo "Installing:" $missing
+  tuvo_apt_install $missing
+}
+
+tuvo_missing_packages() {
+  local package
+  for package in $(tuvo_packages); do
+    case $(dpkg-query -W -f='${db:Status-Abbrev}' "$package" 2>/dev/null) in
+      ?i*) ;;
+      *) echo "$package" ;;
+    esac
+  done
+}
+
+# A subshell, so that the guard goes away however this ends. The guard: a package that brings
+# a service starts it at once unless policy-rc.d says no, and the host asked for no web server.
+tuvo_apt_install() (
+  set -e
+  export DEBIAN_FRONTEND=noninteractive
+  guard=/usr/sbin/policy-rc.d
+  if [ ! -e "$guard" ]; then
+    trap 'rm -f "$guard"' EXIT
+    printf '#!/bin/sh\nexit 101\n' >"$guard"
+    chmod 0755 "$guard"
+  fi
+  options="-o DPkg::Lock::Timeout=300 -o Acquire::Retries=3 -qq"
+  apt-get $options update
+  apt-get $options install --yes --no-install-recommends "$@" </dev/null
+  case " $* " in
+    *" lighttpd "*) update-rc.d lighttpd disable >/dev/null ;;  # nor at the next boot
+  esac
+)
