@@ -1,0 +1,48 @@
+# libtuvosharing: its object files (the tests link these, to reach the private classes) and the
+# shared library made of them, with its pkg-config file and CMake package.
+file(GLOB library_sources CONFIGURE_DEPENDS "${PROJECT_SOURCE_DIR}/utils/*.cpp"
+     "${PROJECT_SOURCE_DIR}/db/*.cpp" "${PROJECT_SOURCE_DIR}/record/*.cpp"
+     "${PROJECT_SOURCE_DIR}/login/*.cpp")
+add_library(tuvosharing_objects OBJECT ${library_sources})
+target_include_directories(tuvosharing_objects PUBLIC "${PROJECT_SOURCE_DIR}/include")
+target_link_libraries(
+  tuvosharing_objects
+  PUBLIC tuvo_platform PkgConfig::JSONCPP
+  PRIVATE tuvo_options PkgConfig::SQLITE3 PkgConfig::LIBGCRYPT OpenSSL::Crypto)
+
+set(version_script "${PROJECT_SOURCE_DIR}/cmake/tuvosharing.map")
+add_library(tuvosharing SHARED $<TARGET_OBJECTS:tuvosharing_objects>)
+add_library(tuvosharing::tuvosharing ALIAS tuvosharing)
+# The number is the binary interface's own, not the release's.
+set_target_properties(tuvosharing PROPERTIES VERSION 7 SOVERSION 7 LINK_DEPENDS
+                                                                   "${version_script}")
+target_include_directories(
+  tuvosharing INTERFACE "$<BUILD_INTERFACE:${PROJECT_SOURCE_DIR}/include>"
+                        "$<INSTALL_INTERFACE:${CMAKE_INSTALL_INCLUDEDIR}>")
+target_link_libraries(
+  tuvosharing
+  PUBLIC PkgConfig::JSONCPP
+  PRIVATE tuvo_options tuvo_platform PkgConfig::SQLITE3 PkgConfig::LIBGCRYPT OpenSSL::Crypto)
+target_link_options(tuvosharing PRIVATE "-Wl,--version-script=${version_script}")
+
+configure_file("${PROJECT_SOURCE_DIR}/cmake/tuvosharing.pc.in" tuvosharing.pc @ONLY)
+configure_package_config_file(
+  "${PROJECT_SOURCE_DIR}/cmake/tuvosharing-config.cmake.in" tuvosharing-config.cmake
+  INSTALL_DESTINATION "${CMAKE_INSTALL_LIBDIR}/cmake/tuvosharing")
+write_basic_package_version_file(tuvosharing-config-version.cmake COMPATIBILITY SameMinorVersion)
+
+install(TARGETS tuvosharing EXPORT tuvosharing LIBRARY DESTINATION "${CMAKE_INSTALL_LIBDIR}")
+install(
+  EXPORT tuvosharing
+  NAMESPACE tuvosharing::
+  FILE tuvosharing-targets.cmake
+  DESTINATION "${CMAKE_INSTALL_LIBDIR}/cmake/tuvosharing")
+install(FILES "${PROJECT_BINARY_DIR}/tuvosharing-config.cmake"
+              "${PROJECT_BINARY_DIR}/tuvosharing-config-version.cmake"
+        DESTINATION "${CMAKE_INSTALL_LIBDIR}/cmake/tuvosharing")
+install(FILES "${PROJECT_BINARY_DIR}/tuvosharing.pc"
+        DESTINATION "${CMAKE_INSTALL_LIBDIR}/pkgconfig")
+install(DIRECTORY "${PROJECT_SOURCE_DIR}/include/tuvosharing"
+        DESTINATION "${CMAKE_INSTALL_INCLUDEDIR}")
+install(FILES "${PROJECT_SOURCE_DIR}/schema/1.sql" "${PROJECT_SOURCE_DIR}/schema/2.sql"
+        DESTINATION share/tuvosharing/db_schema)

@@ -1,0 +1,7 @@
+// Marks what the library exports; everything else in it is hidden.
+#ifndef TUVOSHARING_EXPORT_H_
+#define TUVOSHARING_EXPORT_H_
+
+#define TUVOSHARING_API __attribute__((visibility("default")))
+
+#endif  // TUVOSHARING_EXPORT_H_

@@ -1,0 +1,152 @@
+// The JSON document in a link's "data" column.
+#include <internal/entry_private.h>
+#include <internal/json_text.h>
+#include <tuvosharing/keys.h>
+
+#include <utility>
+
+namespace TUVO::sharing::record {
+
+namespace {
+
+// What a value stands for when it is none of the named ones is part of the format: both ways, the
+// last case below takes all the rest.
+const char* StoredText(Entry::ProtectType type) {
+  return type == Entry::PROTECT_NONE       ? SZK_PROTECT_PROTECT_NONE
+         : type == Entry::PROTECT_PASSWORD ? SZK_PROTECT_PROTECT_PASSWORD
+                                           : SZK_PROTECT_PROTECT_USER;
+}
+
+const char* StoredText(Entry::PasswordEncryptAlgo algo) {
+  return algo == Entry::ENCRYPT_ALGO_DEFAULT ? SZK_PROTECT_PASSWORD_ALGO_DEFAULT
+                                             : SZK_PROTECT_PASSWORD_ALGO_MD5;
+}
+
+const char* StoredText(Entry::RedirectType type) {
+  return type == Entry::REDIRECT_NONE       ? SZK_REDIRECT_REDIRECT_NONE
+         : type == Entry::REDIRECT_URLPARAM ? SZK_REDIRECT_REDIRECT_URLPARAM
+                                            : SZK_REDIRECT_REDIRECT_ALWAYS;
+}
+
+Entry::ProtectType ToProtectType(const std::string& text) {
+  return text == SZK_PROTECT_PROTECT_NONE       ? Entry::PROTECT_NONE
+         : text == SZK_PROTECT_PROTECT_PASSWORD ? Entry::PROTECT_PASSWORD
+                                                : Entry::PROTECT_USER;
+}
+
+Entry::PasswordEncryptAlgo ToPasswordEncryptAlgo(const std::string& text) {
+  return text == SZK_PROTECT_PASSWORD_ALGO_DEFAULT ? Entry::ENCRYPT_ALGO_DEFAULT
+                                                   : Entry::ENCRYPT_ALGO_MD5;
+}
+
+Entry::RedirectType ToRedirectType(const std::string& text) {
+  return text == SZK_REDIRECT_REDIRECT_NONE       ? Entry::REDIRECT_NONE
+         : text == SZK_REDIRECT_REDIRECT_URLPARAM ? Entry::REDIRECT_URLPARAM
+                                                  : Entry::REDIRECT_ALWAYS;
+}
+
+// Each reads the JSON type it is for and, as its empty value, null; false for any other type.
+bool Read(const Json::Value& value, bool& out) {
+  out = value.isBool() && value.asBool();
+  return value.isBool() || value.isNull();
+}
+
+bool Read(const Json::Value& value, std::string& out) {
+  if (value.isString()) {
+    out = value.asString();
+  } else {
+    out.clear();
+  }
+  return value.isString() || value.isNull();
+}
+
+bool Read(const Json::Value& value, unsigned int& out) {
+  if (!value.isUInt()) {
+    return false;
+  }
+  out = value.asUInt();
+  return true;
+}
+
+template <typename T>
+bool Read(const Json::Value& value, std::vector<T>& out) {
+  out.clear();
+  if (!value.isArray() && !value.isNull()) {
+    return false;
+  }
+  for (const Json::Value& element : value) {
+    T item{};
+    if (element.isNull() || !Read(element, item)) {
+      return false;
+    }
+    out.push_back(std::move(item));
+  }
+  return true;
+}
+
+template <typename T>
+Json::Value ToArray(const std::vector<T>& items) {
+  Json::Value array(Json::arrayValue);
+  for (const T& item : items) {
+    array.append(item);
+  }
+  return array;
+}
+
+}  // namespace
+
+std::string EntryPrivate::DataToText() const {
+  Json::Value data(Json::objectValue);
+  data[SZK_ENABLE_MATCH_IP] = enable_match_ip_;
+  data[SZK_PROTECT_TYPE] = StoredText(protect_type_);
+  data[SZK_PROTECT_TITLE] = protect_title_;
+  data[SZK_PROTECT_PASSWORD] = protect_password_;
+  data[SZK_PROTECT_PASSWORD_ALGO] = StoredText(protect_password_algo_);
+  data[SZK_PROTECT_PASSWORD_SALT] = protect_password_salt_;
+  data[SZK_PROTECT_UIDS] = ToArray(protect_uids_);
+  data[SZK_PROTECT_EXTRA_USERS] = ToArray(protect_extra_users_);
+  data[SZK_PROTECT_GIDS] = ToArray(protect_gids_);
+  data[SZK_PROTECT_EXTRA_GROUPS] = ToArray(protect_extra_groups_);
+  data[SZK_REDIRECT_TYPE] = StoredText(redirect_type_);
+  data[SZK_REDIRECT_URI] = redirect_uri_;
+  data[SZK_APP] = app_;
+  data[SZK_PRIVATE_DATA] = private_data_;
+  return JsonToText(data);
+}
+
+bool EntryPrivate::DataFromText(const std::string& text) {
+  Json::Value data;
+  return TextToJson(text, data) && data.isObject() && DataFromJson(data);
+}
+
+bool EntryPrivate::DataFromJson(const Json::Value& data) {
+  // Read into a copy, so that a document that cannot be read changes nothing.
+  EntryPrivate read(*this);
+  std::string protect_type;
+  std::string algo;
+  std::string redirect_type;
+  if (!Read(data[SZK_ENABLE_MATCH_IP], read.enable_match_ip_) ||
+      !Read(data[SZK_PROTECT_TYPE], protect_type) ||
+      !Read(data[SZK_PROTECT_TITLE], read.protect_title_) ||
+      !Read(data[SZK_PROTECT_PASSWORD], read.protect_password_) ||
+      !Read(data[SZK_PROTECT_PASSWORD_ALGO], algo) ||
+      !Read(data[SZK_PROTECT_PASSWORD_SALT], read.protect_password_salt_) ||
+      !Read(data[SZK_PROTECT_UIDS], read.protect_uids_) ||
+      !Read(data[SZK_PROTECT_EXTRA_USERS], read.protect_extra_users_) ||
+      !Read(data[SZK_PROTECT_GIDS], read.protect_gids_) ||
+      !Read(data[SZK_PROTECT_EXTRA_GROUPS], read.protect_extra_groups_) ||
+      !Read(data[SZK_REDIRECT_TYPE], redirect_type) ||
+      !Read(data[SZK_REDIRECT_URI], read.redirect_uri_)) {
+    return false;
+  }
+  read.protect_type_ = ToProtectType(protect_type);
+  read.protect_password_algo_ = ToPasswordEncryptAlgo(algo);
+  read.redirect_type_ = ToRedirectType(redirect_type);
+  read.app_ = data[SZK_APP];
+  read.private_data_ =
+      data.isMember(SZK_PRIVATE_DATA) ? data[SZK_PRIVATE_DATA] : Json::Value(Json::objectValue);
+  *this = std::move(read);
+  return true;
+}
+
+}  // namespace TUVO::sharing::record

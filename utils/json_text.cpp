@@ -1,0 +1,47 @@
+#include <internal/json_text.h>
+#include <json/reader.h>
+#include <json/writer.h>
+
+#include <memory>
+
+namespace TUVO::sharing {
+
+namespace {
+
+Json::StreamWriterBuilder CompactWriter() {
+  Json::StreamWriterBuilder builder;
+  builder["commentStyle"] = "None";
+  builder["indentation"] = "";
+  // Without this the writer decodes texts as UTF-8, and bytes that are none are lost.
+  builder["emitUTF8"] = true;
+  return builder;
+}
+
+Json::CharReaderBuilder Reader() {
+  Json::CharReaderBuilder builder;
+  builder["collectComments"] = true;
+  builder["allowTrailingCommas"] = false;
+  builder["skipBom"] = false;
+  // The reader refuses when this many values are open already.
+  builder["stackLimit"] = kDeepestJson;
+  return builder;
+}
+
+}  // namespace
+
+std::string JsonToText(const Json::Value& value) {
+  static const Json::StreamWriterBuilder builder = CompactWriter();
+  return Json::writeString(builder, value);
+}
+
+bool TextToJson(const std::string& text, Json::Value& value) {
+  static const Json::CharReaderBuilder builder = Reader();
+  const std::unique_ptr<Json::CharReader> reader(builder.newCharReader());
+  try {
+    return reader->parse(text.data(), text.data() + text.size(), &value, nullptr);
+  } catch (const Json::Exception&) {
+    return false;  // nested too deeply
+  }
+}
+
+}  // namespace TUVO::sharing

@@ -1,0 +1,64 @@
+#include <gcrypt.h>
+// MD5 through these calls is what stored passwords were made with; newer OpenSSL marks them old.
+#define OPENSSL_SUPPRESS_DEPRECATED
+#include <openssl/md5.h>
+#include <tuvosharing/utils.h>
+
+#include <memory>
+#include <new>
+
+namespace TUVO::sharing {
+
+namespace {
+
+// Writes two digits a byte and a zero into `text`, which has room for them.
+void WriteHex(const unsigned char* digest, size_t length, char* text) {
+  constexpr char kDigits[] = "0123456789abcdef";
+  for (size_t i = 0; i < length; ++i) {
+    *text++ = kDigits[digest[i] >> 4U];
+    *text++ = kDigits[digest[i] & 15U];
+  }
+  *text = '\0';
+}
+
+}  // namespace
+
+bool MD5HashPassword(const std::string& password, std::string& out) {
+  if (password.empty()) {
+    return false;
+  }
+  unsigned char digest[MD5_DIGEST_LENGTH];
+  MD5_CTX context;
+  if (MD5_Init(&context) < 1 || MD5_Update(&context, password.data(), password.size()) < 1 ||
+      MD5_Final(digest, &context) < 1) {
+    return false;
+  }
+  char text[2 * MD5_DIGEST_LENGTH + 1];
+  WriteHex(digest, sizeof digest, text);
+  out = text;
+  return true;
+}
+
+bool Sha1WithSaltHashPassword(const std::string& password, const std::string& salt,
+                              std::string& out) {
+  const std::string salted = password + salt;
+  // Nobody else in the process is counted on to have made libgcrypt ready; repeating it is
+  // harmless.
+  gcry_control(GCRYCTL_DISABLE_SECMEM, 0);
+  gcry_control(GCRYCTL_INITIALIZATION_FINISHED, 0);
+  const unsigned int length = gcry_md_get_algo_dlen(GCRY_MD_SHA1);
+  unsigned char digest[20];
+  if (length != sizeof digest) {
+    return false;
+  }
+  gcry_md_hash_buffer(GCRY_MD_SHA1, digest, salted.data(), salted.size());
+  const std::unique_ptr<char[]> text(new (std::nothrow) char[2 * length + 1]);
+  if (!text) {
+    return false;
+  }
+  WriteHex(digest, length, text.get());
+  out = text.get();
+  return true;
+}
+
+}  // namespace TUVO::sharing
