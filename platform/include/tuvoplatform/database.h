@@ -1,7 +1,7 @@
 // The platform's database interface: one SQLite file behind an opaque-enough handle, results held
 // as text. Every function may be called from one thread at a time for one handle. A child made by
-// fork inherits SQLite's notes on the locks of its parent, which are wrong for it: while a handle is
-// open, fork only to exec.
+// fork inherits SQLite's notes on the locks of its parent, which are wrong for it: while a handle
+// is open, fork only to exec.
 #ifndef TUVOPLATFORM_DATABASE_H_
 #define TUVOPLATFORM_DATABASE_H_
 
