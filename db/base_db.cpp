@@ -27,8 +27,8 @@ constexpr char kSetUp[] =
     "PRAGMA cache_size = 5000;PRAGMA foreign_keys = ON;PRAGMA journal_mode = WAL;"
     "PRAGMA synchronous = NORMAL;";
 
-// Scratch space above this would threaten the stack.
-constexpr size_t kLargestStackScratch = size_t{256} * 1024;
+// Scratch space above this would threaten the stack, of which a thread may have only 256 KiB.
+constexpr size_t kLargestStackScratch = size_t{64} * 1024;
 
 // Hands a statement's rows to whoever asked for them, or frees them.
 void Deliver(DBResult_tag* rows, Result* result) {
@@ -53,7 +53,10 @@ std::string EscapeInto(char* scratch, size_t size, const std::string& text) {
 
 }  // namespace
 
-BaseDBPrivate::BaseDBPrivate(std::string path, unsigned int mode) : path_(std::move(path)) {
+BaseDBPrivate::BaseDBPrivate(std::string path) : path_(std::move(path)) {}
+
+// Delegates, so that the destructor closes the connection when memory runs out in here.
+BaseDBPrivate::BaseDBPrivate(std::string path, unsigned int mode) : BaseDBPrivate(std::move(path)) {
   if (TLIBCFileExist(path_.c_str()) == 0 && !Create(mode)) {
     good_ = false;
     return;
@@ -83,6 +86,11 @@ BaseDBPrivate::~BaseDBPrivate() {
 
 bool BaseDBPrivate::Create(unsigned int mode) const {
   IF_RUN_AS(kSystemUid, kSystemGid) {
+    // A caller that may not look into the folder takes every file for missing; one that is there
+    // keeps its mode.
+    if (TLIBCFileExist(path_.c_str()) != 0) {
+      return true;
+    }
     if (TLIBCFileTouch(path_.c_str()) == -1) {
       SHARING_LOG_PID("create database failed on %s\n\n", path_.c_str());
       return false;
@@ -125,22 +133,20 @@ bool BaseDBPrivate::IsGood() const {
 bool BaseDBPrivate::Execute(const std::string& sql, Result* result) {
   DBResult_tag* rows = nullptr;
   bool done = false;
-  if (IsGood()) {
+  if (!IsGood()) {
+    SHARING_LOG_PID("db is not good.\n\n");
+  } else if (sql.find('\0') != std::string::npos) {
+    // The platform would run what stands before the zero: another statement than the one meant.
+    last_error_ = "the statement holds a NUL byte";
+  } else {
     last_query_ = sql;
     done = ExecuteAsSystem(sql, &rows);
-  } else {
-    SHARING_LOG_PID("db is not good.\n\n");
   }
   Deliver(rows, result);
   return done;
 }
 
 bool BaseDBPrivate::ExecuteAsSystem(const std::string& sql, DBResult_tag** rows) {
-  // The platform would run what stands before the zero: another statement than the one meant.
-  if (sql.find('\0') != std::string::npos) {
-    last_error_ = "the statement holds a NUL byte";
-    return false;
-  }
   IF_RUN_AS(kSystemUid, kSystemGid) {
     if (TUVODBExecute(handle_, sql.c_str(), rows) == -1) {
       last_error_ = TUVODBErrorGet(handle_);

@@ -4,13 +4,19 @@
 #include <tuvosharing/object.h>
 #include <tuvosharing/object_db.h>
 
+#include <exception>
+
 namespace TUVO::sharing::db {
 
 ObjectDB::ObjectDB(BaseDB& db, const char* table)
     : db_(&db), table_(table), condition_(std::make_unique<Condition>(db)) {}
 
 ObjectDB::~ObjectDB() {
-  db_->ExecuteWALCheckPoint();
+  try {
+    db_->ExecuteWALCheckPoint();
+  } catch (const std::exception&) {
+    // For want of memory, which must not end the process. The next store makes up for it.
+  }
 }
 
 bool ObjectDB::Create(record::Object& obj) {

@@ -30,11 +30,11 @@ bool SharingDBPrivate::Migration() {
     SHARING_LOG_PID("user_version is not correct\n\n");
     return false;
   }
-  // A file of a newer schema is left to those who know it: none of its numbers is reached here.
-  for (int version = row.GetField("user_version").AsInt(0) + 1; version <= kCurrentVersion;
-       ++version) {
-    if (!MigrateTo(version)) {
-      SHARING_LOG_PID("cannot migrate from %d to %d\n\n", version - 1, version);
+  // A file of a newer schema is left to those who know it: the loop is never entered. It counts by
+  // the version reached, since the one after the greatest is no int.
+  for (int version = row.GetField("user_version").AsInt(0); version < kCurrentVersion; ++version) {
+    if (!MigrateTo(version + 1)) {
+      SHARING_LOG_PID("cannot migrate from %d to %d\n\n", version, version + 1);
       return false;
     }
   }
@@ -52,11 +52,12 @@ bool SharingDBPrivate::MigrateTo(int version) {
     return false;
   }
   std::stringstream sstr;
-  if (file.is_open()) {
+  // An empty script is none to copy: copying nothing counts as a failure.
+  if (file.is_open() && file.peek() != std::ifstream::traits_type::eof()) {
     sstr << file.rdbuf();
   }
-  // A folder opens and fails on reading; an empty script only sets the stream's fail flag.
-  if (!file.is_open() || sstr.bad()) {
+  // A folder opens and fails on the first reading, a broken disk perhaps later.
+  if (!file.is_open() || file.bad() || sstr.fail()) {
     SHARING_LOG_PID("file %s open failed %s.\n\n", path.c_str(), internal::ErrorText().c_str());
     return false;
   }

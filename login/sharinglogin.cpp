@@ -10,6 +10,7 @@
 
 #include <ctime>
 #include <exception>
+#include <limits>
 
 namespace TUVO {
 
@@ -48,8 +49,11 @@ constexpr unsigned int kNoUid = static_cast<unsigned int>(-1);
 // Name under which failed logins are counted.
 constexpr char kService[] = "SHARING";
 
+// Where times have 32 bits, the last day of theirs has no end of its own.
 long EndOfLifetime() {
-  return static_cast<long>(std::time(nullptr)) + kLifetimeSeconds;
+  constexpr long kLast = std::numeric_limits<long>::max();
+  const long now = std::time(nullptr);
+  return now > kLast - kLifetimeSeconds ? kLast : now + kLifetimeSeconds;
 }
 
 // A look-up answers false for "no such row" and for a row that is not legal any more; only the

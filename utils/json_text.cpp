@@ -14,6 +14,9 @@ Json::StreamWriterBuilder CompactWriter() {
   builder["indentation"] = "";
   // Without this the writer decodes texts as UTF-8, and bytes that are none are lost.
   builder["emitUTF8"] = true;
+  // Numbers without a JSON form come back as what they were; otherwise they would be written as
+  // something that the reader refuses, and the whole document with it.
+  builder["useSpecialFloats"] = true;
   return builder;
 }
 
@@ -22,6 +25,7 @@ Json::CharReaderBuilder Reader() {
   builder["collectComments"] = true;
   builder["allowTrailingCommas"] = false;
   builder["skipBom"] = false;
+  builder["allowSpecialFloats"] = true;
   // The reader refuses when this many values are open already.
   builder["stackLimit"] = kDeepestJson;
   return builder;

@@ -35,6 +35,7 @@ class BaseDBPrivate {
   bool MoveRootDB() const;
 
  private:
+  explicit BaseDBPrivate(std::string path);
   bool Create(unsigned int mode) const;
   bool Connect();
   bool Init();

@@ -15,7 +15,7 @@ class BaseDBPrivate;
 class Result;
 
 // Every statement runs with the effective ids of the system identity (uid 1, gid 1), which the
-// process must be or be able to take (saved or effective root); they are put back before the call
+// process must be or be able to take (root among its ids); they are put back before the call
 // returns. The switch changes the ids of the whole process: use a connection from one thread at
 // a time, and nothing else may depend on the effective ids meanwhile.
 //

@@ -25,12 +25,15 @@ class Object;
 // visitors must prove themselves. Times are seconds since the epoch; 0 means "not set".
 class TUVOSHARING_API Entry {
  public:
+  // The three kinds below may hold any int: numbers that callers pass on unchecked have a meaning
+  // too.
+
   // How visitors are admitted.
-  enum ProtectType { PROTECT_NONE = 0, PROTECT_PASSWORD = 1, PROTECT_USER = 2 };
+  enum ProtectType : int { PROTECT_NONE = 0, PROTECT_PASSWORD = 1, PROTECT_USER = 2 };
   // How the link's password is kept: salted SHA-1, or plain MD5.
-  enum PasswordEncryptAlgo { ENCRYPT_ALGO_DEFAULT = 0, ENCRYPT_ALGO_MD5 = 1 };
+  enum PasswordEncryptAlgo : int { ENCRYPT_ALGO_DEFAULT = 0, ENCRYPT_ALGO_MD5 = 1 };
   // When the visitor is sent on to redirect_uri.
-  enum RedirectType { REDIRECT_NONE = 0, REDIRECT_URLPARAM = 1, REDIRECT_ALWAYS = 2 };
+  enum RedirectType : int { REDIRECT_NONE = 0, REDIRECT_URLPARAM = 1, REDIRECT_ALWAYS = 2 };
 
   // Enabled, unprotected, collected once expired, bound to the visitor's address; not legal until
   // it has a hash, a project, an owner and an object as `app`.

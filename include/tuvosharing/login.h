@@ -75,7 +75,7 @@ TUVOSHARING_API int TuvoSharingLogin(std::string& session_id, _tag_sharing_login
 TUVOSHARING_API int TuvoSharingIsAuthorized(const _tag_sharing_login_params* params);
 
 // Ends the session's access to one link; the session stays, for other links. False, logged, when
-// there is no such session, link or token.
+// there is no such session, link or token, or the session or token has expired.
 TUVOSHARING_API bool TuvoSharingLogout(const std::string& hash, const std::string& session_id);
 
 // Counts one use of a link. False when there is no such link or it could not be written.

@@ -18,7 +18,8 @@ namespace TUVO::sharing {
 TUVOSHARING_API std::string GetRealUsername(const char* name);
 
 // Looks an account up by login name (converted as above). The caller frees `user` with
-// TUVOUserFree. Only the platform's answer -1 is a failure, it logs one line; after any other
+// TUVOUserFree. Only the platform's answer -1 is a failure, it logs one line and leaves `user` as
+// the platform does (null on plain Linux); after any other
 // answer the result is true, and `user` may then still be null.
 TUVOSHARING_API bool UserGet(const char* name, TUVOUSER*& user);
 
