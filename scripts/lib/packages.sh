@@ -1,3 +1,4 @@
+# shellcheck shell=bash
 # To be sourced. install_packages: makes sure that everything that the build, the tests and the
 # demonstration need is on this machine, as packages of Debian 12; nothing else is ever installed.
 # Quick, and without need of root or a network, when nothing is missing.
@@ -17,14 +18,19 @@ libpam0g-dev        # account logins
 libcgicc-dev        # request parameters of the CGI programs
 libgtest-dev        # the tests
 clang-format        # the test of the sources' format
-python3             # the test of the folders' order
-strace              # tests: which system calls are made, and what happens when one fails
-sqlite3             # tests look into the database from outside
-openssl             # passwords of the tests' private accounts
-util-linux          # unshare: the private mount namespace that tests and demonstration run in
-mount               # lays that namespace out
-lighttpd            # the web server of the demonstration
-curl                # the visitor's browser there
+python3             # tests: the order of the layers; the programs as a browser meets them
+python3-selenium    # tests: drives a real browser
+chromium            # that browser
+chromium-driver     # what selenium drives it through
+strace              # tests: in which order the programs give up root and read the request
+procps              # tests: ps, which processes a program leaves
+sqlite3             # tests: the database file looked at from outside
+openssl             # the passwords of the private accounts
+util-linux          # unshare: the private namespaces that tests and demonstration run in
+mount               # lays those out
+lighttpd            # the web server in front of the programs
+media-types         # /etc/mime.types, from which the programs name a file's type
+curl                # the demonstration's visitor
 LIST
 }
 
@@ -35,15 +41,15 @@ install_packages() {
     tuvo_packages | sed 's/^/  /' >&2
     return 1
   fi
-  local missing
-  missing=$(tuvo_missing_packages)
-  [ -z "$missing" ] && return 0
+  local -a missing
+  mapfile -t missing < <(tuvo_missing_packages)
+  [ ${#missing[@]} -eq 0 ] && return 0
   if [ "$(id -u)" -ne 0 ]; then
-    echo "These packages are missing, and installing them needs root (sudo):" $missing >&2
+    echo "These packages are missing, and installing them needs root (sudo): ${missing[*]}" >&2
     return 1
   fi
-  echo "Installing:" $missing
-  tuvo_apt_install $missing
+  echo "Installing: ${missing[*]}"
+  tuvo_apt_install "${missing[@]}"
 }
 
 tuvo_missing_packages() {
@@ -67,9 +73,9 @@ tuvo_apt_install() (
     printf '#!/bin/sh\nexit 101\n' >"$guard"
     chmod 0755 "$guard"
   fi
-  options="-o DPkg::Lock::Timeout=300 -o Acquire::Retries=3 -qq"
-  apt-get $options update
-  apt-get $options install --yes --no-install-recommends "$@" </dev/null
+  options=(-qq -o DPkg::Lock::Timeout=300 -o Acquire::Retries=3)
+  apt-get "${options[@]}" update
+  apt-get "${options[@]}" install --yes --no-install-recommends "$@" </dev/null
   case " $* " in
     *" lighttpd "*) update-rc.d lighttpd disable >/dev/null ;;  # nor at the next boot
   esac

@@ -1,0 +1,143 @@
+#include "visitor/page.h"
+
+#include <tuvosharing/keys.h>
+
+#include "visitor/html.h"
+#include "visitor/route.h"
+
+namespace visitor {
+
+const std::string_view kPageStyle =
+    ":root{color-scheme:light dark}"
+    "*{box-sizing:border-box}"
+    "body{margin:0;padding:1rem;font:1rem/1.5 system-ui,sans-serif;background:Canvas;"
+    "color:CanvasText}"
+    "main{max-width:26rem;margin:min(12vh,4rem) auto 0;padding:1.5rem 2rem 2rem;border:1px solid "
+    "GrayText;"
+    "border-radius:.75rem}"
+    "h1{margin:0 0 .75rem;font-size:1.35rem;line-height:1.3;overflow-wrap:anywhere}"
+    "p{margin:0 0 1rem}"
+    "main>:last-child{margin-bottom:0}"
+    "label{display:block;margin:0 0 .25rem;font-weight:600}"
+    "input{display:block;width:100%;margin:0 0 1rem;padding:.6rem .7rem;font:inherit;"
+    "border:1px solid GrayText;border-radius:.4rem;background:Field;color:FieldText}"
+    "button{width:100%;padding:.65rem;font:inherit;font-weight:600;border:0;border-radius:.4rem;"
+    "background:#1a5fb4;color:#fff;cursor:pointer}"
+    "button:hover{background:#154d92}"
+    ":focus-visible{outline:3px solid #62a0ea;outline-offset:2px}"
+    ".complaint{padding:.6rem .8rem;border-left:.3rem solid #c01c28;background:#c01c281a}";
+const std::string_view kPageStyleDigest = "Uvsd4Kg1hYfyZBPod5aV2Mfp6lLsCd+lHYNCZL4Dfdg=";
+
+namespace {
+
+constexpr std::string_view kUntitled = "Shared link";
+constexpr std::string_view kComplaintId = "complaint";
+
+std::string Document(std::string_view title, const std::string& content) {
+  return "<!DOCTYPE html>\n<html lang=\"en\">\n<head>\n<meta charset=\"utf-8\">\n"
+         "<meta name=\"viewport\" content=\"width=device-width, initial-scale=1\">\n<title>" +
+         HtmlEscape(title) + "</title>\n<style>" + std::string(kPageStyle) +
+         "</style>\n</head>\n<body>\n<main>\n<h1>" + HtmlEscape(title) + "</h1>\n" + content +
+         "</main>\n</body>\n</html>\n";
+}
+
+std::string Paragraph(std::string_view text) {
+  return "<p>" + HtmlEscape(text) + "</p>\n";
+}
+
+// Read out at once by screen readers, and again with the fields that refer to it.
+std::string Complaint(std::string_view text) {
+  return "<p class=\"complaint\" id=\"" + std::string(kComplaintId) + "\" role=\"alert\">" +
+         HtmlEscape(text) + "</p>\n";
+}
+
+std::string FormStart(std::string_view action) {
+  return "<form method=\"post\" action=\"" + HtmlEscape(action) + "\">\n";
+}
+
+std::string Button(std::string_view text, bool focused) {
+  return std::string("<button type=\"submit\"") + (focused ? " autofocus" : "") + ">" +
+         HtmlEscape(text) + "</button>\n";
+}
+
+struct Field {
+  std::string_view name;
+  std::string_view label;
+  std::string_view attributes;  // type and autocompletion
+  std::string_view value;
+  bool focused = false;
+};
+
+std::string Labelled(const Field& field, bool has_complaint) {
+  const std::string name = HtmlEscape(field.name);
+  std::string html = "<label for=\"" + name + "\">" + HtmlEscape(field.label) +
+                     "</label>\n<input id=\"" + name + "\" name=\"" + name + "\" " +
+                     std::string(field.attributes) + " required";
+  if (!field.value.empty()) {
+    html += " value=\"" + HtmlEscape(field.value) + "\"";
+  }
+  if (has_complaint) {
+    html += " aria-describedby=\"" + std::string(kComplaintId) + "\" aria-invalid=\"true\"";
+  }
+  return html + (field.focused ? " autofocus>\n" : ">\n");
+}
+
+std::string Fields(const AdmissionForm& form) {
+  const bool complains = !form.complaint.empty();
+  if (form.ask == Ask::kPassword) {
+    return Labelled({TUVO::sharing::SZK_PASSWORD_, "Password",
+                     "type=\"password\" autocomplete=\"current-password\"", "", true},
+                    complains);
+  }
+  if (form.ask == Ask::kAccount) {
+    const bool knows_name = !form.user_name.empty();
+    return Labelled({TUVO::sharing::SZK_ZOR_USERNAME, "Account name",
+                     "type=\"text\" autocomplete=\"username\" autocapitalize=\"none\" "
+                     "spellcheck=\"false\"",
+                     form.user_name, !knows_name},
+                    complains) +
+           Labelled({TUVO::sharing::SZK_ZOR_PASSWORD, "Account password",
+                     "type=\"password\" autocomplete=\"current-password\"", "", knows_name},
+                    complains);
+  }
+  return {};
+}
+
+std::string_view Instruction(Ask ask) {
+  switch (ask) {
+    case Ask::kPassword:
+      return "This link is protected. Type the password that you were given with it.";
+    case Ask::kAccount:
+      return "This link is for certain accounts. Sign in with yours.";
+    default:
+      return "Somebody shared this with you.";
+  }
+}
+
+}  // namespace
+
+std::string FormHtml(const AdmissionForm& form) {
+  std::string content =
+      form.complaint.empty() ? Paragraph(Instruction(form.ask)) : Complaint(form.complaint);
+  content += FormStart(form.action) + Fields(form);
+  if (form.keeps_redirect) {
+    content +=
+        "<input type=\"hidden\" name=\"" + std::string(kRedirectParameter) + "\" value=\"1\">\n";
+  }
+  content += Button("Open", form.ask == Ask::kNothing) + "</form>\n";
+  return Document(form.title.empty() ? kUntitled : form.title, content);
+}
+
+std::string NoticeHtml(const NoticePage& page) {
+  std::string content = Paragraph(page.text);
+  if (!page.button.empty()) {
+    content += FormStart(page.action) + Button(page.button, true) + "</form>\n";
+  }
+  if (!page.link.empty()) {
+    content +=
+        "<p><a href=\"" + HtmlEscape(page.link) + "\">" + HtmlEscape(page.link_text) + "</a></p>\n";
+  }
+  return Document(page.heading, content);
+}
+
+}  // namespace visitor
