@@ -1,0 +1,197 @@
+// Who frees a result and how its rows are walked. This program counts, and answers, the platform's
+// calls itself.
+#include <gtest/gtest.h>
+#include <tuvoplatform/database.h>
+#include <tuvosharing/result.h>
+
+#include <string>
+#include <type_traits>
+#include <utility>
+#include <vector>
+
+// Three rows, number 10, 20 and 30.
+struct DBResult_tag {
+  std::vector<unsigned int> rows{10, 20, 30};
+  size_t next = 0;
+};
+
+namespace {
+
+std::vector<DBResult_tag*> freed;
+std::vector<unsigned int> cursors;  // as they came in with each step
+std::vector<const DBResult_tag*> walked;
+
+}  // namespace
+
+extern "C" {
+
+int TUVODBFetchRow(DBResult_tag* result, unsigned int* row) {
+  walked.push_back(result);
+  cursors.push_back(*row);
+  if (result == nullptr || result->next == result->rows.size()) {
+    return -1;
+  }
+  *row = result->rows[result->next++];
+  return 0;
+}
+
+const char* TUVODBFetchField(DBResult_tag* /*result*/, unsigned int row, const char* name) {
+  static std::string text;
+  text = std::to_string(row) + name;
+  return text.c_str();
+}
+
+void TUVODBFreeResult(DBResult_tag* result) {
+  if (result != nullptr) {
+    freed.push_back(result);
+  }
+}
+
+}  // extern "C"
+
+namespace {
+
+using TUVO::sharing::db::Result;
+using TUVO::sharing::db::Row;
+
+class ResultTest : public testing::Test {
+ protected:
+  ResultTest() {
+    freed.clear();
+    cursors.clear();
+    walked.clear();
+  }
+
+  static std::string Number(const Row& row) { return row.GetField("").AsString(""); }
+
+  DBResult_tag handle_;
+  DBResult_tag other_;
+};
+
+TEST_F(ResultTest, WithoutAHandleItIsNotGoodHasNoRowsAndFreesNothing) {
+  {
+    Result result;
+    EXPECT_FALSE(result.IsGood());
+    Row row;
+    EXPECT_FALSE(result.NextRow(row));
+    EXPECT_FALSE(row.IsGood());
+  }
+  EXPECT_EQ(walked, std::vector<const DBResult_tag*>{nullptr}) << "the platform is asked";
+  EXPECT_TRUE(freed.empty());
+}
+
+TEST_F(ResultTest, AHandleFromTheConstructorIsFreedOnce) {
+  {
+    const Result result(&handle_);
+    EXPECT_TRUE(result.IsGood());
+  }
+  EXPECT_EQ(freed, std::vector<DBResult_tag*>{&handle_});
+}
+
+TEST_F(ResultTest, AHandleThatWasSetIsFreedOnce) {
+  {
+    Result result;
+    result.SetResult(&handle_);
+    EXPECT_TRUE(result.IsGood());
+  }
+  EXPECT_EQ(freed, std::vector<DBResult_tag*>{&handle_});
+}
+
+TEST_F(ResultTest, AHandleThatIsReplacedIsNotFreed) {
+  {
+    Result result(&handle_);
+    result.SetResult(&other_);
+    EXPECT_TRUE(freed.empty());
+  }
+  EXPECT_EQ(freed, std::vector<DBResult_tag*>{&other_});
+}
+
+TEST_F(ResultTest, AHandleReplacedByNoneIsNotFreed) {
+  {
+    Result result(&handle_);
+    result.SetResult(nullptr);
+    EXPECT_FALSE(result.IsGood());
+  }
+  EXPECT_TRUE(freed.empty());
+}
+
+TEST_F(ResultTest, RowsAreWalkedInOrderAndCarryHandleAndCursor) {
+  Result result(&handle_);
+  Row row;
+  std::vector<std::string> numbers;
+  while (result.NextRow(row)) {
+    EXPECT_TRUE(row.IsGood());
+    numbers.push_back(Number(row));
+  }
+  EXPECT_EQ(numbers, (std::vector<std::string>{"10", "20", "30"}));
+}
+
+TEST_F(ResultTest, TheCursorBeginsAtZeroAndIsThePlatformsOwnAfterwards) {
+  Result result(&handle_);
+  Row row;
+  while (result.NextRow(row)) {
+  }
+  EXPECT_EQ(cursors, (std::vector<unsigned int>{0, 10, 20, 30}));
+}
+
+TEST_F(ResultTest, BehindTheLastRowTheRowIsLeftAsItWas) {
+  Result result(&handle_);
+  Row row;
+  while (result.NextRow(row)) {
+  }
+  EXPECT_FALSE(result.NextRow(row));
+  EXPECT_TRUE(row.IsGood());
+  EXPECT_EQ(Number(row), "30");
+}
+
+TEST_F(ResultTest, EveryAnswerButMinusOneIsARow) {
+  handle_.rows = {0};
+  Result result(&handle_);
+  Row row;
+  EXPECT_TRUE(result.NextRow(row));
+  EXPECT_EQ(Number(row), "0");
+}
+
+TEST_F(ResultTest, CannotBeCopied) {
+  static_assert(!std::is_copy_constructible_v<Result>);
+  static_assert(!std::is_copy_assignable_v<Result>);
+}
+
+TEST_F(ResultTest, MovingHandsTheHandleOverWithItsPlace) {
+  {
+    Result source(&handle_);
+    Row row;
+    EXPECT_TRUE(source.NextRow(row));
+    Result target(std::move(source));
+    EXPECT_FALSE(source.IsGood());  // NOLINT(bugprone-use-after-move): what a move leaves is told
+    EXPECT_TRUE(target.NextRow(row));
+    EXPECT_EQ(Number(row), "20");
+    EXPECT_EQ(cursors, (std::vector<unsigned int>{0, 10}));
+  }
+  EXPECT_EQ(freed, std::vector<DBResult_tag*>{&handle_});
+}
+
+TEST_F(ResultTest, MovingOntoAnotherFreesWhatThatHeld) {
+  {
+    Result source(&handle_);
+    Result target(&other_);
+    target = std::move(source);
+    EXPECT_EQ(freed, std::vector<DBResult_tag*>{&other_});
+    EXPECT_TRUE(target.IsGood());
+    EXPECT_FALSE(source.IsGood());  // NOLINT(bugprone-use-after-move)
+  }
+  EXPECT_EQ(freed, (std::vector<DBResult_tag*>{&other_, &handle_}));
+}
+
+TEST_F(ResultTest, MovingOntoItselfKeepsTheHandle) {
+  {
+    Result result(&handle_);
+    Result& same = result;
+    result = std::move(same);
+    EXPECT_TRUE(result.IsGood());
+    EXPECT_TRUE(freed.empty());
+  }
+  EXPECT_EQ(freed, std::vector<DBResult_tag*>{&handle_});
+}
+
+}  // namespace

@@ -1,0 +1,118 @@
+// Failures of the migration that need the platform's help: this program stands between the two.
+#include <dlfcn.h>
+#include <gtest/gtest.h>
+#include <tuvoplatform/database.h>
+#include <tuvosharing/sharing_db.h>
+
+#include <cerrno>
+#include <cstring>
+#include <functional>
+#include <string>
+#include <vector>
+
+#include "log_lines.h"
+#include "support/child.h"
+#include "support/seccomp_filter.h"
+#include "support/syslog_listener.h"
+#include "test_files.h"
+
+namespace {
+
+std::string failing_statement;
+bool no_row = false;
+std::function<void()> at_first_row;
+
+}  // namespace
+
+extern "C" {
+
+int TUVODBExecute(TUVODB* db, const char* sql, DBResult_tag** result) {
+  if (failing_statement == sql) {
+    *result = nullptr;
+    errno = EIO;
+    return -1;
+  }
+  return reinterpret_cast<decltype(&TUVODBExecute)>(dlsym(RTLD_NEXT, "TUVODBExecute"))(db, sql,
+                                                                                       result);
+}
+
+int TUVODBFetchRow(DBResult_tag* result, unsigned int* row) {
+  if (at_first_row) {
+    at_first_row();
+    at_first_row = nullptr;
+  }
+  if (no_row) {
+    return -1;
+  }
+  return reinterpret_cast<decltype(&TUVODBFetchRow)>(dlsym(RTLD_NEXT, "TUVODBFetchRow"))(result,
+                                                                                         row);
+}
+
+}  // extern "C"
+
+namespace {
+
+using TUVO::sharing::db::SharingDB;
+using tuvo_test::NewPath;
+using tuvo_test::SyslogListener;
+using tuvo_test::TakeLines;
+using Lines = std::vector<std::string>;
+
+class SharingDBPlatform : public testing::Test {
+ protected:
+  SharingDBPlatform() : path_(NewPath("/tmp/sharing platform.db")) {}
+  ~SharingDBPlatform() override {
+    failing_statement.clear();
+    no_row = false;
+    at_first_row = nullptr;
+  }
+
+  void ExpectNotMigrated() const {
+    const SharingDB db(path_);
+    EXPECT_FALSE(db.IsGood());
+    EXPECT_TRUE(db.BaseDB::IsGood());
+    EXPECT_EQ(db.GetLastQuery(), "PRAGMA user_version") << "no script ran";
+  }
+
+  std::string path_;
+  SyslogListener listener_;
+};
+
+TEST_F(SharingDBPlatform, AVersionThatCannotBeAskedForFails) {
+  failing_statement = "PRAGMA user_version";
+  ExpectNotMigrated();
+  EXPECT_EQ(TakeLines(listener_),
+            Lines{"sharing_db:LINE (PID) Failed [!pdb_->Execute(\"PRAGMA user_version\", result)], "
+                  "err=Input/output error\n\n"});
+}
+
+TEST_F(SharingDBPlatform, AVersionWithoutARowFails) {
+  no_row = true;
+  ExpectNotMigrated();
+  EXPECT_EQ(TakeLines(listener_), Lines{"sharing_db:LINE (PID) user_version is not correct\n\n"});
+}
+
+// The identity is lost between the question for the version and the first script.
+TEST_F(SharingDBPlatform, AScriptThatCannotBeReadAsTheSystemFails) {
+  if (!tuvo_test::CanRefuseCalls()) {
+    GTEST_SKIP() << "this system has no system call filters";
+  }
+  at_first_row = [] {
+    EXPECT_TRUE(tuvo_test::RefuseCalls({{tuvo_test::kSetresgid, EPERM, 1, 1}}));
+  };
+  EXPECT_EQ(tuvo_test::RunInChildAs(tuvo_test::kSavedRoot,
+                                    [&] {
+                                      const SharingDB db(path_);
+                                      EXPECT_FALSE(db.IsGood());
+                                      EXPECT_EQ(tuvo_test::ToText(tuvo_test::CurrentIds()),
+                                                tuvo_test::ToText(tuvo_test::kSavedRoot));
+                                      _exit(testing::Test::HasFailure() ? 1 : 0);
+                                      return 0;
+                                    }),
+            0);
+  EXPECT_EQ(TakeLines(listener_), (Lines{"sharing_db:LINE ERROR: IF_RUN_AS(1, 1)",
+                                         "sharing_db:LINE (PID) failed to run as system\n\n",
+                                         "sharing_db:LINE (PID) cannot migrate from 0 to 1\n\n"}));
+}
+
+}  // namespace

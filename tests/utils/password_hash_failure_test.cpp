@@ -1,0 +1,128 @@
+// The digests when the libraries beneath them or the memory give out. This program puts functions
+// of its own before those of the libraries, hence it is one of its own.
+#include <dlfcn.h>
+#include <gcrypt.h>
+#include <gtest/gtest.h>
+#define OPENSSL_SUPPRESS_DEPRECATED
+#include <openssl/md5.h>
+#include <tuvosharing/utils.h>
+
+#include <new>
+#include <string>
+#include <vector>
+
+namespace {
+
+std::string failing;             // the one function that fails
+std::vector<std::string> calls;  // what was called, in order
+
+int Answer(const char* name) {
+  calls.emplace_back(name);
+  return failing == name ? 0 : 1;
+}
+
+template <typename Function>
+Function Real(const char* name) {
+  return reinterpret_cast<Function>(dlsym(RTLD_NEXT, name));
+}
+
+}  // namespace
+
+extern "C" {
+
+int MD5_Init(MD5_CTX* context) {
+  return Answer("MD5_Init") == 1 ? Real<decltype(&MD5_Init)>("MD5_Init")(context) : 0;
+}
+
+int MD5_Update(MD5_CTX* context, const void* data, size_t length) {
+  return Answer("MD5_Update") == 1
+             ? Real<decltype(&MD5_Update)>("MD5_Update")(context, data, length)
+             : 0;
+}
+
+int MD5_Final(unsigned char* digest, MD5_CTX* context) {
+  return Answer("MD5_Final") == 1 ? Real<decltype(&MD5_Final)>("MD5_Final")(digest, context) : 0;
+}
+
+gcry_error_t gcry_control(enum gcry_ctl_cmds command, ...) {
+  calls.push_back(command == GCRYCTL_DISABLE_SECMEM            ? "DISABLE_SECMEM"
+                  : command == GCRYCTL_INITIALIZATION_FINISHED ? "INITIALIZATION_FINISHED"
+                                                               : "another command");
+  return Real<decltype(&gcry_control)>("gcry_control")(command, 0);
+}
+
+void gcry_md_hash_buffer(int algo, void* digest, const void* buffer, size_t length) {
+  calls.emplace_back("gcry_md_hash_buffer");
+  Real<decltype(&gcry_md_hash_buffer)>("gcry_md_hash_buffer")(algo, digest, buffer, length);
+}
+
+}  // extern "C"
+
+void* operator new[](std::size_t size, const std::nothrow_t& /*tag*/) noexcept {
+  if (failing == "new") {
+    return nullptr;
+  }
+  try {
+    return ::operator new[](size);
+  } catch (const std::bad_alloc&) {
+    return nullptr;
+  }
+}
+
+namespace {
+
+using TUVO::sharing::MD5HashPassword;
+using TUVO::sharing::Sha1WithSaltHashPassword;
+using Calls = std::vector<std::string>;
+
+class PasswordHashFailure : public testing::Test {
+ protected:
+  PasswordHashFailure() { Reset(""); }
+  ~PasswordHashFailure() override { Reset(""); }
+
+  static void Reset(const std::string& name) {
+    failing = name;
+    calls.clear();
+  }
+};
+
+TEST_F(PasswordHashFailure, EachFailingStepOfMd5FailsTheDigestAndLeavesTheOutputAlone) {
+  for (const char* step : {"MD5_Init", "MD5_Update", "MD5_Final"}) {
+    Reset(step);
+    std::string out = "kept";
+    EXPECT_FALSE(MD5HashPassword("abc", out)) << step;
+    EXPECT_EQ(out, "kept") << step;
+    EXPECT_EQ(calls.back(), step);
+  }
+}
+
+TEST_F(PasswordHashFailure, Md5IsMadeOfOpensslsThreeSteps) {
+  std::string out;
+  EXPECT_TRUE(MD5HashPassword("abc", out));
+  EXPECT_EQ(calls, (Calls{"MD5_Init", "MD5_Update", "MD5_Final"}));
+}
+
+TEST_F(PasswordHashFailure, AnEmptyPasswordAsksOpensslForNothing) {
+  std::string out;
+  EXPECT_FALSE(MD5HashPassword("", out));
+  EXPECT_EQ(calls, Calls{});
+}
+
+TEST_F(PasswordHashFailure, Sha1MakesLibgcryptReadyBeforeEveryDigest) {
+  std::string out;
+  const Calls once{"DISABLE_SECMEM", "INITIALIZATION_FINISHED", "gcry_md_hash_buffer"};
+  for (int i = 0; i < 2; ++i) {
+    calls.clear();
+    EXPECT_TRUE(Sha1WithSaltHashPassword("ab", "c", out));
+    EXPECT_EQ(calls, once);
+  }
+}
+
+TEST_F(PasswordHashFailure, Sha1WithoutMemoryFailsAndLeavesTheOutputAlone) {
+  Reset("new");
+  std::string out = "kept";
+  EXPECT_FALSE(Sha1WithSaltHashPassword("ab", "c", out));
+  EXPECT_EQ(out, "kept");
+}
+
+}  // namespace
