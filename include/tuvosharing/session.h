@@ -46,6 +46,7 @@ class TUVOSHARING_API Session {
   bool IsLegal() const;
 
   // Sets "session_id", "uid", "ip" and "timeout" (seconds) and leaves other members alone.
+  // Precondition: `value` is null or an object.
   void ToJSON(Json::Value& value) const;
 
   // Loads a row and answers IsLegal().

@@ -45,6 +45,7 @@ class TUVOSHARING_API Token {
   bool IsLegal() const;
 
   // Sets "entry_id", "session_id" and "timeout" (seconds) and leaves other members alone.
+  // Precondition: `value` is null or an object.
   void ToJSON(Json::Value& value) const;
 
   // Loads a row and answers IsLegal().
