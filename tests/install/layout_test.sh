@@ -40,7 +40,7 @@ runpath() { objdump -p "$stage/usr/tuvo/lib/$1" | sed -n 's/^ *RUNPATH *//p'; }
 [ "$(soname libtuvosharing.so)" = libtuvosharing.so.7 ] || fail "SONAME of libtuvosharing"
 [ "$(soname libtuvoplatform.so)" = libtuvoplatform.so.1 ] || fail "SONAME of libtuvoplatform"
 needed libtuvosharing.so.7 | grep -qx libtuvoplatform.so.1 || fail "libtuvoplatform is not needed"
-[ "$(runpath libtuvosharing.so.7)" = /usr/tuvo/lib ] || fail "run path of libtuvosharing"
+[ "$(runpath libtuvosharing.so.7)" = '$ORIGIN:$ORIGIN/../lib:/usr/tuvo/lib' ] || fail "run path of libtuvosharing"
 
 # The scripts that a new database file is made with, unchanged.
 for version in 1 2; do
