@@ -5,6 +5,9 @@
 #include <cstring>
 #include <stdexcept>
 
+// Programs were compiled against these five pointers and no more.
+static_assert(sizeof(_tag_sharing_login_params) == 5 * sizeof(const char*));
+
 namespace {
 
 // A null pointer is the caller's error and ends a C program; the text is the one that such programs

@@ -147,6 +147,7 @@ auto Guarded(const Body& body, Failure failure) -> decltype(body()) {
 
 }  // namespace
 
+// cppcheck-suppress constParameter  ; the platform fixes the type
 int TUVOUserLoginNameConvert(const char* name, char* real, unsigned int /*size*/) {
   return name != nullptr && real != nullptr ? 0 : -1;
 }
