@@ -1,7 +1,8 @@
 # shellcheck shell=bash
-# To be sourced. install_packages: makes sure that everything that the build, the tests and the
-# demonstration need is on this machine, as packages of Debian 12; nothing else is ever installed.
-# Quick, and without need of root or a network, when nothing is missing.
+# To be sourced. install_packages [PACKAGE...]: makes sure that everything that the build, the tests
+# and the demonstration need is on this machine, and the packages named besides, as packages of
+# Debian 12; nothing else is ever installed. Quick, and without need of root or a network, when
+# nothing is missing.
 
 # One package a line, and the reason for it.
 tuvo_packages() {
@@ -25,6 +26,7 @@ chromium-driver     # what selenium drives it through
 strace              # tests: in which order the programs give up root and read the request
 procps              # tests: ps, which processes a program leaves
 sqlite3             # tests: the database file looked at from outside
+abigail-tools       # tests: compare the binary interface with the kept one
 openssl             # the passwords of the private accounts
 util-linux          # unshare: the private namespaces that tests and demonstration run in
 mount               # lays those out
@@ -34,7 +36,7 @@ curl                # the demonstration's visitor
 LIST
 }
 
-# install_packages: returns 0 when everything is there, else says why not and returns 1.
+# install_packages [PACKAGE...]: returns 0 when everything is there, else says why not and returns 1.
 install_packages() {
   if ! command -v apt-get >/dev/null || ! command -v dpkg-query >/dev/null; then
     echo "This is no Debian system: install the counterparts of these packages yourself:" >&2
@@ -42,7 +44,7 @@ install_packages() {
     return 1
   fi
   local -a missing
-  mapfile -t missing < <(tuvo_missing_packages)
+  mapfile -t missing < <(tuvo_missing_packages "$@")
   [ ${#missing[@]} -eq 0 ] && return 0
   if [ "$(id -u)" -ne 0 ]; then
     echo "These packages are missing, and installing them needs root (sudo): ${missing[*]}" >&2
@@ -54,7 +56,7 @@ install_packages() {
 
 tuvo_missing_packages() {
   local package
-  for package in $(tuvo_packages); do
+  for package in $(tuvo_packages) "$@"; do
     case $(dpkg-query -W -f='${db:Status-Abbrev}' "$package" 2>/dev/null) in
       ?i*) ;;
       *) echo "$package" ;;

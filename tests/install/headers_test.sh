@@ -7,7 +7,7 @@ project=$1
 . "$(dirname "$0")/common.sh"
 
 read -ra json < <(pkg-config --cflags jsoncpp)
-options=(-fsyntax-only -Wall -Wextra -Wpedantic -Wconversion -Wshadow -Werror
+options=(-fsyntax-only -D_FILE_OFFSET_BITS=64 -Wall -Wextra -Wpedantic -Wconversion -Wshadow -Werror
   "-I$project/include" "-I$project/platform/include" "${json[@]}")
 
 # The library's and the platform's, several at a time.

@@ -14,6 +14,9 @@ TEST(VisitorHttpDate, IsWrittenInTheFixedForm) {
 }
 
 TEST(VisitorHttpDate, TimeWithoutAYearHasNoDate) {
+  if (sizeof(std::time_t) == 4) {
+    GTEST_SKIP() << "a time of 32 bits always has a year";
+  }
   EXPECT_EQ(HttpDate(std::numeric_limits<std::time_t>::max()), "");
 }
 

@@ -5,6 +5,12 @@
 #include <sys/stat.h>
 #include <tuvoplatform/export.h>
 
+// On 32-bit systems there are two layouts of struct stat; the library writes the one for large
+// files.
+#if __SIZEOF_LONG__ == 4 && (!defined(_FILE_OFFSET_BITS) || _FILE_OFFSET_BITS != 64)
+#error "compile with -D_FILE_OFFSET_BITS=64"
+#endif
+
 #ifdef __cplusplus
 extern "C" {
 #endif
