@@ -17,6 +17,7 @@
 #include <functional>
 #include <map>
 #include <memory>
+#include <new>
 #include <optional>
 #include <string>
 #include <vector>
@@ -24,7 +25,9 @@
 #include "log_lines.h"
 #include "support/child.h"
 #include "support/seccomp_filter.h"
+#include "support/source_line.h"
 #include "support/syslog_listener.h"
+#include "support/written_line.h"
 #include "test_files.h"
 
 namespace {
@@ -33,6 +36,9 @@ std::vector<std::string> calls;      // "name(arguments) as euid:egid", in order
 std::map<std::string, int> answers;  // in place of the platform's own
 DBResult_tag* rows_on_failure = nullptr;
 std::function<void()> at_execute;  // runs within the next statement
+
+std::vector<size_t> scratches;  // taken from the heap, by size
+bool no_memory = false;         // for the next one
 
 int within = 0;  // calls of the platform among its own functions are its own business
 
@@ -159,6 +165,16 @@ int TLIBCPclose(FILE* stream) {
 
 }  // extern "C"
 
+// How the library takes scratch space that may be large.
+void* operator new[](std::size_t size, const std::nothrow_t& /*tag*/) noexcept {
+  scratches.push_back(size);
+  try {
+    return no_memory ? nullptr : ::operator new[](size);
+  } catch (const std::bad_alloc&) {
+    return nullptr;
+  }
+}
+
 namespace {
 
 using TUVO::sharing::db::BaseDB;
@@ -192,6 +208,7 @@ class BaseDBPlatform : public testing::Test {
     rows_on_failure = nullptr;
     NewPath(kPath);
     calls.clear();
+    scratches.clear();
   }
   ~BaseDBPlatform() override { answers.clear(); }
 
@@ -362,6 +379,44 @@ TEST_F(BaseDBPlatform, AConnectionThatIsNotGoodFreesNullAndAsksForNothingElse) {
   EXPECT_EQ(TakeCalls(), Lines{});
 }
 
+// A Result that another statement filled must not be taken for this one's.
+TEST_F(BaseDBPlatform, AStatementThatIsNotRunHandsOnThatThereAreNoRows) {
+  Open();
+  answers["TUVODBConnect"] = 0;
+  BaseDB bad(kPath, 0660);
+  DBResult_tag* rows = MadeUpRows();
+  Result result;
+  result.SetResult(rows);
+  EXPECT_FALSE(bad.Execute("SELECT 1", result));
+  EXPECT_FALSE(result.IsGood());
+  result.SetResult(rows);
+  EXPECT_FALSE(db_->Execute(std::string("SELECT 1\0", 9), result));
+  EXPECT_FALSE(result.IsGood());
+  EXPECT_EQ(tuvo_test::RunInChild([&] {
+              EXPECT_EQ(setresuid(65534, 65534, 65534), 0);
+              calls.clear();
+              result.SetResult(rows);
+              EXPECT_FALSE(db_->Execute("SELECT 1", result));
+              EXPECT_FALSE(result.IsGood());
+              EXPECT_EQ(calls, Lines{});
+              _exit(testing::Test::HasFailure() ? 1 : 0);  // its closing is another matter
+              return 0;
+            }),
+            0);
+  REAL(TUVODBFreeResult)(rows);
+}
+
+TEST_F(BaseDBPlatform, WithoutTheSystemIdentityTheConnectionIsClosedAllTheSame) {
+  Open();
+  EXPECT_EQ(tuvo_test::RunInChild([this] {
+              EXPECT_EQ(setresuid(65534, 65534, 65534), 0);
+              db_.reset();
+              EXPECT_EQ(calls, Lines{"TUVODBClose() as 65534:0"});
+              return 0;
+            }),
+            0);
+}
+
 TEST_F(BaseDBPlatform, TheWholeTextGoesToThePlatformInOneCall) {
   Open();
   EXPECT_TRUE(db_->Execute("CREATE TABLE a (x);CREATE TABLE b (x);"));
@@ -427,15 +482,27 @@ TEST_F(BaseDBPlatform, OnlyMinusOneIsAFailureOfEscaping) {
   EXPECT_EQ(TakeLines(listener_), Lines{});
 }
 
-TEST_F(BaseDBPlatform, TheLineOfAFailedEscapeHasItsPriority) {
+TEST_F(BaseDBPlatform, OrdinaryTextsAreEscapedWithoutTheHeap) {
   Open();
-  answers["TUVODBEscapeStringEX2"] = -1;
-  db_->Escape("text");
-  const std::vector<tuvo_test::LogLine> lines = listener_.Take();
-  ASSERT_EQ(lines.size(), 1U);
-  EXPECT_EQ(lines[0].priority, LOG_ERR);
-  EXPECT_EQ(lines[0].facility, LOG_USER);
-  EXPECT_EQ(tuvo_test::Normalized(lines[0].text), "base_db:LINE (PID) escape failed\n\n");
+  for (const size_t length : {0, 1, 1000, 32767, 32768}) {
+    EXPECT_EQ(db_->Escape(std::string(length, '\'')).size(), 2 * length);
+  }
+  EXPECT_EQ(scratches, std::vector<size_t>{});
+  EXPECT_EQ(db_->Escape(std::string(32769, '\'')).size(), 65538U);
+  EXPECT_EQ(scratches, std::vector<size_t>{65538});
+}
+
+TEST_F(BaseDBPlatform, WithoutMemoryForALongTextEscapingFailsAndAsksThePlatformForNothing) {
+  Open();
+  no_memory = true;
+  EXPECT_EQ(db_->Escape(std::string(1000000, 'x')), "");
+  no_memory = false;
+  EXPECT_EQ(calls, Lines{});
+  const int line = tuvo_test::SourceLine("db/base_db.cpp", "(\"escape failed",
+                                         "std::string BaseDBPrivate::Escape(");
+  EXPECT_EQ(tuvo_test::TakeWritten(listener_),
+            Lines{"user.err base_db:" + std::to_string(line) + " (" + std::to_string(getpid()) +
+                  ") escape failed\n\n"});
 }
 
 // --- A file of root ---------------------------------------------------------------------------

@@ -2,6 +2,7 @@
 #include <fcntl.h>
 #include <grp.h>
 #include <gtest/gtest.h>
+#include <internal/base_db_private.h>
 #include <pthread.h>
 #include <sched.h>
 #include <sys/mount.h>
@@ -16,29 +17,41 @@
 #include <locale>
 #include <memory>
 #include <string>
+#include <type_traits>
 #include <vector>
 
 #include "log_lines.h"
 #include "sqlite_file.h"
 #include "support/child.h"
+#include "support/class_layout.h"
 #include "support/seccomp_filter.h"
 #include "support/syslog_listener.h"
 #include "test_files.h"
 
+namespace tuvo_test {
+
+using TUVO::sharing::db::BaseDBPrivate;
+auto MembersOf(const BaseDBPrivate&);
+template struct Reveal<BaseDBPrivate, &BaseDBPrivate::good_, &BaseDBPrivate::path_,
+                       &BaseDBPrivate::handle_, &BaseDBPrivate::last_error_,
+                       &BaseDBPrivate::last_query_>;
+
+}  // namespace tuvo_test
+
 namespace {
 
 using TUVO::sharing::db::BaseDB;
+using TUVO::sharing::db::BaseDBPrivate;
 using TUVO::sharing::db::Result;
 using TUVO::sharing::db::Row;
 using tuvo_test::CurrentIds;
 using tuvo_test::Exists;
-using tuvo_test::Ids;
 using tuvo_test::kNobody;
 using tuvo_test::kPrivateFolder;
 using tuvo_test::kRoot;
 using tuvo_test::kSavedRoot;
-using tuvo_test::kSystem;
 using tuvo_test::LogLine;
+using tuvo_test::MembersOf;
 using tuvo_test::NewPath;
 using tuvo_test::OwnerAndMode;
 using tuvo_test::RunInChild;
@@ -94,154 +107,27 @@ class Database : public testing::Test {
   BaseDB db_;
 };
 
-// --- Creation and opening ---------------------------------------------------------------------
-
-struct Start {
-  const char* name;
-  Ids ids;
-};
-
-// From each identity under which the system identity is, or can be taken.
-class Identity : public testing::TestWithParam<Start> {
- protected:
-  // Runs `body` in a child with these ids, which must be the same afterwards.
-  static void InChild(const std::function<void()>& body) {
-    const Ids& ids = GetParam().ids;
-    EXPECT_EQ(RunInChildAs(ids,
-                           [&] {
-                             body();
-                             EXPECT_EQ(ToText(CurrentIds()), ToText(ids));
-                             return 0;
-                           }),
-              0);
+// Programs that were built against the library rely on both.
+TEST(BaseDB, ItsTableHasTheDestructorAloneAndItHoldsOnePointer) {
+  EXPECT_TRUE(std::has_virtual_destructor_v<BaseDB>);
+  EXPECT_EQ(sizeof(BaseDB), 2 * sizeof(void*));
+  if (tuvo_test::kTablesCanBeRead) {
+    EXPECT_EQ(tuvo_test::SlotCount<BaseDB>(), 2U);
+    EXPECT_EQ(tuvo_test::SlotCount<BaseDBPrivate>(), 2U);
   }
-
-  SyslogListener listener_;
-};
-
-// A folder where nobody else may write shows that the system identity was in force.
-TEST_P(Identity, AMissingFileIsMadeForTheSystemIdentityWithTheModeAskedFor) {
-  const std::string path = PrivatePath("created.db");
-  InChild([&] {
-    const BaseDB db(path, kMode);
-    EXPECT_TRUE(db.IsGood());
-    EXPECT_EQ(ToText(CurrentIds()), ToText(GetParam().ids));
-  });
-  EXPECT_EQ(OwnerAndMode(path), "1:1 0660");
-  EXPECT_EQ(TakeLines(listener_), Lines{});
 }
 
-TEST_P(Identity, AnExistingFileOfTheSystemIdentityIsOpened) {
-  const std::string path = PrivatePath("existing.db");
-  WriteFile(path, "");
-  ASSERT_EQ(chown(path.c_str(), 1, 1), 0);
-  ASSERT_EQ(chmod(path.c_str(), 0600), 0);
-  InChild([&] {
-    const BaseDB db(path, kMode);
-    EXPECT_TRUE(db.IsGood());
-  });
-  EXPECT_EQ(OwnerAndMode(path), "1:1 0600");
+TEST(BaseDB, ItsFieldsStandInTheirOrder) {
+  const BaseDBPrivate db("/tmp", kMode);
+  EXPECT_TRUE(tuvo_test::StandInThisOrder(db, MembersOf(db)));
 }
 
-TEST_P(Identity, StatementsRunAndTheIdsAreTheSameAfterEach) {
-  const std::string path = PrivatePath("used.db");
-  InChild([&] {
-    const std::string ids = ToText(GetParam().ids);
-    BaseDB db(path, kMode);
-    EXPECT_TRUE(db.Execute("CREATE TABLE t (id INTEGER PRIMARY KEY, a)"));
-    EXPECT_EQ(ToText(CurrentIds()), ids);
-    EXPECT_TRUE(db.Insert("t", {"x"}));
-    EXPECT_EQ(ToText(CurrentIds()), ids);
-    EXPECT_FALSE(db.Execute("nonsense"));
-    EXPECT_EQ(ToText(CurrentIds()), ids);
-    EXPECT_TRUE(db.ExecuteWALCheckPoint());
-    EXPECT_TRUE(db.Vacuum());
-    EXPECT_EQ(ToText(CurrentIds()), ids);
-  });
-  EXPECT_EQ(SqliteFile(path).Value("SELECT a FROM t"), "x");
-  EXPECT_EQ(TakeLines(listener_), Lines{});
+TEST(BaseDB, CannotBeCopied) {
+  EXPECT_FALSE(std::is_copy_constructible_v<BaseDB>);
+  EXPECT_FALSE(std::is_copy_assignable_v<BaseDB>);
 }
 
-TEST_P(Identity, TheFilesBesideTheDatabaseBelongToTheSystemIdentityToo) {
-  const std::string path = PrivatePath("beside.db");
-  InChild([&] {
-    BaseDB db(path, kMode);
-    EXPECT_TRUE(db.Execute("CREATE TABLE t (a)"));
-    EXPECT_EQ(OwnerAndMode(path + "-wal"), "1:1 0660");
-    EXPECT_EQ(OwnerAndMode(path + "-shm"), "1:1 0660");
-  });
-}
-
-TEST_P(Identity, ClosingFoldsTheLogBackAndRemovesIt) {
-  const std::string path = PrivatePath("closed.db");
-  InChild([&] {
-    BaseDB db(path, kMode);
-    EXPECT_TRUE(db.Execute("CREATE TABLE t (a)"));
-  });
-  EXPECT_TRUE(Exists(path));
-  EXPECT_FALSE(Exists(path + "-wal"));
-  EXPECT_FALSE(Exists(path + "-shm"));
-}
-
-INSTANTIATE_TEST_SUITE_P(Starts, Identity,
-                         testing::Values(Start{"root", kRoot}, Start{"savedRoot", kSavedRoot},
-                                         Start{"system", kSystem}),
-                         [](const auto& start) { return std::string(start.param.name); });
-// Neither of them is nor can become the system identity.
-class WithoutIdentity : public testing::TestWithParam<Start> {};
-
-TEST_P(WithoutIdentity, AMissingFileIsNotMade) {
-  SyslogListener listener;
-  const std::string path = NewPath("/tmp/nobodys.db");
-  EXPECT_EQ(RunInChildAs(GetParam().ids,
-                         [&] {
-                           const BaseDB db(path, kMode);
-                           EXPECT_FALSE(db.IsGood());
-                           EXPECT_EQ(ToText(CurrentIds()), ToText(GetParam().ids));
-                           return 0;
-                         }),
-            0);
-  EXPECT_FALSE(Exists(path));
-  EXPECT_EQ(TakeLines(listener), (Lines{kSwitchLine, kNotSystemLine}));
-}
-
-TEST_P(WithoutIdentity, AnExistingFileIsNotOpened) {
-  SyslogListener listener;
-  const std::string path = NewPath("/tmp/everybodys.db");
-  WriteFile(path, "");
-  ASSERT_EQ(chmod(path.c_str(), 0666), 0);
-  EXPECT_EQ(RunInChildAs(GetParam().ids,
-                         [&] {
-                           const BaseDB db(path, kMode);
-                           EXPECT_FALSE(db.IsGood());
-                           EXPECT_EQ(ToText(CurrentIds()), ToText(GetParam().ids));
-                           return 0;
-                         }),
-            0);
-  EXPECT_EQ(TakeLines(listener), (Lines{kSwitchLine, kNotSystemLine}));
-}
-
-INSTANTIATE_TEST_SUITE_P(Starts, WithoutIdentity,
-                         testing::Values(Start{"nobody", kNobody},
-                                         Start{"realAndSavedSystem", {1, 65534, 1, 1, 65534, 1}},
-                                         Start{"alice", {2001, 2001, 2001, 2001, 2001, 2001}}),
-                         [](const auto& start) { return std::string(start.param.name); });
-
-TEST(BaseDB, TheLinesOfAFailureHaveTheirFacilitiesAndPriorities) {
-  SyslogListener listener;
-  EXPECT_EQ(RunInChildAs(kNobody,
-                         [] {
-                           const BaseDB db("/tmp/nobodys other.db", kMode);
-                           return 0;
-                         }),
-            0);
-  const std::vector<LogLine> lines = listener.Take();
-  ASSERT_EQ(lines.size(), 2U);
-  EXPECT_EQ(lines[0].facility, LOG_AUTH);
-  EXPECT_EQ(lines[0].priority, LOG_ERR);
-  EXPECT_EQ(lines[1].facility, LOG_USER);
-  EXPECT_EQ(lines[1].priority, LOG_ERR);
-}
+// --- Creation and opening ---------------------------------------------------------------------
 
 TEST(BaseDB, TheModeOfANewFileIsTheOneAskedForWhateverTheUmask) {
   const mode_t former = umask(077);
@@ -454,29 +340,6 @@ TEST(BaseDB, ClosingRollsAnOpenTransactionBack) {
     EXPECT_TRUE(db.Execute("INSERT INTO t VALUES (1)"));
   }
   EXPECT_EQ(SqliteFile(path).Value("SELECT COUNT(*) FROM t"), "0");
-}
-
-// Every id-changing call ends the process here.
-TEST(BaseDB, UnderTheSystemIdentityNoIdIsEverTouched) {
-  if (!tuvo_test::CanRefuseCalls()) {
-    GTEST_SKIP() << "this system has no system call filters";
-  }
-  const std::string path = PrivatePath("untouched ids.db");
-  EXPECT_EQ(RunInChildAs(kSystem,
-                         [&] {
-                           EXPECT_TRUE(
-                               tuvo_test::RefuseCalls({{tuvo_test::kSetresuid, tuvo_test::kKill},
-                                                       {tuvo_test::kSetresgid, tuvo_test::kKill}}));
-                           BaseDB db(path, kMode);
-                           EXPECT_TRUE(db.IsGood());
-                           EXPECT_TRUE(db.Execute("CREATE TABLE t (id INTEGER PRIMARY KEY, a)"));
-                           EXPECT_TRUE(db.Insert("t", {"x"}));
-                           EXPECT_FALSE(db.Execute("nonsense"));
-                           EXPECT_TRUE(db.ExecuteWALCheckPoint());
-                           EXPECT_FALSE(db.IsRoot());
-                           return 0;
-                         }),
-            0);
 }
 
 // --- Statements -------------------------------------------------------------------------------
@@ -886,6 +749,32 @@ TEST(RootFile, IsOneOfUserRootAndGroupRoot) {
   }
 }
 
+// Another account has the number 0 here, and the name "root" another number.
+TEST(RootFile, TheNamesDecideNotTheNumbers) {
+  const std::string path = NewPath("/tmp/named.db");
+  WriteFile(path, "");
+  ASSERT_EQ(chmod(path.c_str(), 0666), 0);
+  WriteFile("/tmp/other passwd", "toor:x:0:0::/:/bin/false\nroot:x:2001:2001::/:/bin/false\n");
+  WriteFile("/tmp/other group", "wheel:x:0:\nroot:x:3001:\n");
+  EXPECT_EQ(RunInChild([&] {
+              const BaseDB db(path, kMode);
+              EXPECT_TRUE(db.IsRoot());
+              EXPECT_EQ(unshare(CLONE_NEWNS), 0);
+              EXPECT_EQ(mount(nullptr, "/", nullptr, MS_REC | MS_PRIVATE, nullptr), 0);
+              EXPECT_EQ(mount("/tmp/other passwd", "/etc/passwd", nullptr, MS_BIND, nullptr), 0);
+              EXPECT_EQ(mount("/tmp/other group", "/etc/group", nullptr, MS_BIND, nullptr), 0);
+              EXPECT_FALSE(db.IsRoot());
+              EXPECT_EQ(chown(path.c_str(), 2001, 3001), 0);
+              EXPECT_TRUE(db.IsRoot());
+              EXPECT_EQ(chown(path.c_str(), 2001, 0), 0);
+              EXPECT_FALSE(db.IsRoot());
+              EXPECT_EQ(chown(path.c_str(), 0, 3001), 0);
+              EXPECT_FALSE(db.IsRoot());
+              return 0;
+            }),
+            0);
+}
+
 TEST(RootFile, AFileThatIsGoneIsNotRoots) {
   const std::string path = NewPath("/tmp/gone.db");
   const BaseDB db(path, kMode);
@@ -909,50 +798,6 @@ std::string RootFileIn(const char* name) {
   SqliteFile(path).Execute("CREATE TABLE t (a)");
   EXPECT_EQ(chmod(path.c_str(), 0666), 0);
   return path;
-}
-
-// Mind the sense: false is what a move that succeeded answers.
-TEST(RootFile, IsMovedAsideFromEachIdentityThatCanBeRoot) {
-  for (const Ids& ids : {kRoot, kSavedRoot, Ids{1, 1, 0, 1, 1, 0}}) {
-    SyslogListener listener;
-    const std::string path = RootFileIn("moved.db");
-    EXPECT_EQ(RunInChildAs(ids,
-                           [&] {
-                             const BaseDB db(path, kMode);
-                             EXPECT_TRUE(db.IsGood());
-                             EXPECT_TRUE(db.IsRoot());
-                             EXPECT_FALSE(db.MoveRootDB());
-                             EXPECT_EQ(ToText(CurrentIds()), ToText(ids));
-                             return 0;
-                           }),
-              0);
-    EXPECT_FALSE(Exists(path));
-    EXPECT_EQ(OwnerAndMode("/tmp/moved.db"), "0:0 0666");
-    EXPECT_EQ(TakeLines(listener), Lines{});
-  }
-}
-
-TEST(RootFile, IsNotMovedFromAnIdentityThatCannotBeRoot) {
-  for (const Ids& ids : {kSystem, kNobody}) {
-    SyslogListener listener;
-    const std::string path = RootFileIn("stays.db");
-    EXPECT_EQ(RunInChildAs(ids,
-                           [&] {
-                             const BaseDB db(path, kMode);
-                             EXPECT_FALSE(db.MoveRootDB());
-                             EXPECT_EQ(ToText(CurrentIds()), ToText(ids));
-                             return 0;
-                           }),
-              0);
-    EXPECT_TRUE(Exists(path));
-    Lines lines = TakeLines(listener);
-    if (ids.euid == kNobody.euid) {  // the opening has its own two lines
-      ASSERT_EQ(lines.size(), 4U);
-      lines.erase(lines.begin(), lines.begin() + 2);
-    }
-    EXPECT_EQ(lines, (Lines{"base_db:LINE ERROR: IF_RUN_AS(0, 0)",
-                            "base_db:LINE Permssion denied. uid=" + std::to_string(ids.ruid)}));
-  }
 }
 
 TEST(RootFile, TheLineOfARefusedMoveShowsTheRealUid) {

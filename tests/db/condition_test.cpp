@@ -1,4 +1,5 @@
 #include <gtest/gtest.h>
+#include <internal/condition_private.h>
 #include <tuvosharing/base_db.h>
 #include <tuvosharing/condition.h>
 #include <tuvosharing/result.h>
@@ -9,9 +10,21 @@
 #include <type_traits>
 #include <vector>
 
+#include "support/class_layout.h"
 #include "test_files.h"
 
+namespace tuvo_test {
+
+using TUVO::sharing::db::ConditionPrivate;
+auto MembersOf(const ConditionPrivate&);
+template struct Reveal<ConditionPrivate, &ConditionPrivate::wheres_, &ConditionPrivate::orders_,
+                       &ConditionPrivate::offset_, &ConditionPrivate::limit_>;
+
+}  // namespace tuvo_test
+
 namespace {
+
+using tuvo_test::MembersOf;
 
 using TUVO::sharing::db::BaseDB;
 using TUVO::sharing::db::Condition;
@@ -187,12 +200,17 @@ TEST_F(ConditionTest, ThePageOfSizeMinusOneIsStillSomething) {
   EXPECT_EQ(Sql(), "");
 }
 
-TEST_F(ConditionTest, AbsurdPagesAreComputedWithoutHarm) {
-  condition_.Page(INT_MAX, INT_MAX);
-  condition_.Page(INT_MIN, INT_MIN);
-  condition_.Page(INT_MIN, INT_MAX);
+TEST_F(ConditionTest, AbsurdPagesWrapAround) {
   condition_.Page(50000, 50000);
-  EXPECT_EQ(Sql().compare(0, 12, " LIMIT 50000"), 0);
+  EXPECT_EQ(Sql(), " LIMIT 50000");
+  condition_.Page(100001, 50000);
+  EXPECT_EQ(Sql(), " LIMIT 50000 OFFSET 705032704");
+  condition_.Page(INT_MAX, INT_MAX);
+  EXPECT_EQ(Sql(), " LIMIT 2147483647");
+  condition_.Page(INT_MIN, INT_MAX);
+  EXPECT_EQ(Sql(), " LIMIT 2147483647 OFFSET 1");
+  condition_.Page(INT_MIN, INT_MIN);
+  EXPECT_EQ(Sql(), "");
 }
 
 TEST_F(ConditionTest, AllPartsStandInTheirOrder) {
@@ -222,6 +240,20 @@ TEST_F(ConditionTest, ClearForgetsEverything) {
   EXPECT_EQ(Sql(), "");
   condition_.OrWhere("c = 3");
   EXPECT_EQ(Sql(), " WHERE c = 3");
+}
+
+TEST_F(ConditionTest, ItsTableHasTheDestructorAloneAndItHoldsOnePointer) {
+  EXPECT_TRUE(std::has_virtual_destructor_v<Condition>);
+  EXPECT_EQ(sizeof(Condition), 2 * sizeof(void*));
+  if (tuvo_test::kTablesCanBeRead) {
+    EXPECT_EQ(tuvo_test::SlotCount<Condition>(), 2U);
+  }
+}
+
+// In front of them stands the connection, a reference.
+TEST_F(ConditionTest, ItsFieldsStandInTheirOrder) {
+  const TUVO::sharing::db::ConditionPrivate fields(db_);
+  EXPECT_TRUE(tuvo_test::StandInThisOrder(fields, MembersOf(fields)));
 }
 
 TEST_F(ConditionTest, CannotBeCopied) {

@@ -14,12 +14,12 @@
 #include <memory>
 #include <set>
 #include <string>
-#include <type_traits>
 #include <vector>
 
 #include "log_lines.h"
 #include "sqlite_file.h"
 #include "statement_time.h"
+#include "store_layout.h"
 #include "store_records.h"
 #include "support/child.h"
 #include "support/seccomp_filter.h"
@@ -181,12 +181,11 @@ TEST_F(EntryDBTest, ItsEndRunsACheckpoint) {
   EXPECT_EQ(db_.GetLastQuery(), "PRAGMA wal_checkpoint;");
 }
 
-TEST_F(EntryDBTest, TheStoreIsAnObjectDBBehindAHandle) {
-  static_assert(std::is_base_of_v<ObjectDB, EntryDBPrivate>);
-  static_assert(sizeof(EntryDBPrivate) == sizeof(ObjectDB), "adds no members");
-  static_assert(sizeof(EntryDB) == 2 * sizeof(void*), "one pointer beside the virtual table's");
-  static_assert(std::has_virtual_destructor_v<EntryDB>);
-  static_assert(!std::is_copy_constructible_v<EntryDB>);
+TEST_F(EntryDBTest, TheStoreHasTheTableOfAllStoresBehindAHandle) {
+  tuvo_test::ExpectTablesOfAStore<EntryDB, EntryDBPrivate>(db_);
+}
+
+TEST_F(EntryDBTest, TheStoreIsDeletedFromThroughItsBase) {
   EntryDBPrivate store(db_);
   EXPECT_TRUE(static_cast<ObjectDB&>(store).Delete(7));
   EXPECT_EQ(Seen(), "DELETE FROM entry WHERE id=7");

@@ -4,11 +4,23 @@
 #include <climits>
 #include <locale>
 #include <string>
+#include <type_traits>
 #include <utility>
+
+#include "support/class_layout.h"
+
+namespace tuvo_test {
+
+using TUVO::sharing::db::Field;
+auto MembersOf(const Field&);
+template struct Reveal<Field, &Field::value_, &Field::stream_>;
+
+}  // namespace tuvo_test
 
 namespace {
 
 using TUVO::sharing::db::Field;
+using tuvo_test::MembersOf;
 
 TEST(Field, AnIntIsRead) {
   EXPECT_EQ(Field("42").AsInt(0), 42);
@@ -47,6 +59,8 @@ TEST(Field, AnUnsignedIntIsReadAndANegativeOneWraps) {
   EXPECT_EQ(Field("4294967295").AsUInt(0), 4294967295U);
   EXPECT_EQ(Field("-1").AsUInt(0), 4294967295U);
   EXPECT_EQ(Field("1026").AsUInt(0), 1026U);
+  EXPECT_EQ(Field("-4294967295").AsUInt(0), 1U);
+  EXPECT_EQ(Field("-4294967296").AsUInt(5), 5U);
 }
 
 TEST(Field, ATimeIsRead) {
@@ -54,6 +68,8 @@ TEST(Field, ATimeIsRead) {
   EXPECT_EQ(Field("-1").AsTime(0), -1L);
   EXPECT_EQ(Field("").AsTime(0), 0L);
   EXPECT_EQ(Field(std::to_string(LONG_MAX)).AsTime(0), LONG_MAX);
+  EXPECT_EQ(Field("2147483647").AsTime(0), 2147483647L);
+  EXPECT_EQ(Field(std::to_string(LONG_MAX) + "0").AsTime(5), 5L);
 }
 
 TEST(Field, AFloatIsRead) {
@@ -62,6 +78,8 @@ TEST(Field, AFloatIsRead) {
   EXPECT_EQ(Field("3").AsFloat(0.0F), 3.0F);
   EXPECT_EQ(Field("x").AsFloat(1.5F), 1.5F);
   EXPECT_EQ(Field("").AsFloat(1.5F), 1.5F);
+  EXPECT_EQ(Field("nan").AsFloat(1.5F), 1.5F);
+  EXPECT_EQ(Field("inf").AsFloat(1.5F), 1.5F);
 }
 
 TEST(Field, OnlyTheTextOneIsTrueAndTheDefaultIsNeverUsed) {
@@ -98,6 +116,9 @@ TEST(Field, ASecondConversionAfterAFailedOneGivesTheDefault) {
   Field field("abc");
   EXPECT_EQ(field.AsInt(1), 1);
   EXPECT_EQ(field.AsInt(2), 2);
+  Field too_long("99999999999 ");
+  EXPECT_EQ(too_long.AsInt(1), 1);
+  EXPECT_EQ(too_long.AsFloat(2.0F), 2.0F) << "which alone would have read it";
 }
 
 TEST(Field, AConversionThatStoppedBeforeTheEndCanBeRepeated) {
@@ -145,6 +166,15 @@ TEST(Field, AssigningAFieldToItselfChangesNothing) {
   Field& same = field;
   field = same;
   EXPECT_EQ(field.AsInt(0), 42);
+}
+
+TEST(Field, ItsTableHasTheDestructorAloneAndTheTextStandsBeforeTheStream) {
+  const Field field("42");
+  EXPECT_TRUE(std::has_virtual_destructor_v<Field>);
+  EXPECT_TRUE(tuvo_test::StandInThisOrder(field, MembersOf(field)));
+  if (tuvo_test::kTablesCanBeRead) {
+    EXPECT_EQ(tuvo_test::SlotCount<Field>(), 2U);
+  }
 }
 
 // Groups digits and has another decimal point and other words for booleans.

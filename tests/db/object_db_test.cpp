@@ -2,26 +2,39 @@
 #include <gtest/gtest.h>
 #include <internal/object_db_query.h>
 #include <json/value.h>
-#include <syslog.h>
 #include <tuvosharing/base_db.h>
 #include <tuvosharing/condition.h>
 #include <tuvosharing/object.h>
 #include <tuvosharing/object_db.h>
 #include <tuvosharing/row.h>
+#include <unistd.h>
 
 #include <climits>
 #include <locale>
 #include <map>
 #include <memory>
 #include <string>
+#include <tuple>
 #include <type_traits>
 #include <utility>
 #include <vector>
 
 #include "log_lines.h"
 #include "sqlite_file.h"
+#include "support/class_layout.h"
+#include "support/source_line.h"
 #include "support/syslog_listener.h"
+#include "support/written_line.h"
 #include "test_files.h"
+
+namespace tuvo_test {
+
+using TUVO::sharing::db::ObjectDB;
+auto MembersOf(const ObjectDB&);
+template struct Reveal<ObjectDB, &ObjectDB::db_, &ObjectDB::table_, &ObjectDB::flag_,
+                       &ObjectDB::condition_>;
+
+}  // namespace tuvo_test
 
 namespace {
 
@@ -30,10 +43,12 @@ using TUVO::sharing::db::Condition;
 using TUVO::sharing::db::ObjectDB;
 using TUVO::sharing::db::Row;
 using TUVO::sharing::record::Object;
-using tuvo_test::LogLine;
+using tuvo_test::MembersOf;
+using tuvo_test::Slot;
 using tuvo_test::SqliteFile;
 using tuvo_test::SyslogListener;
 using tuvo_test::TakeLines;
+using tuvo_test::TakeWritten;
 using Lines = std::vector<std::string>;
 
 constexpr char kPath[] = "/tmp/object.db";
@@ -69,6 +84,18 @@ class ThingDB : public ObjectDB {
   std::string Table() const { return GetTable(); }
   const BaseDB* Database() const { return &GetDB(); }
 };
+
+// What the function of object_db.cpp that begins so logs, whole: the line feed is one.
+std::string LineOf(const std::string& function, const std::string& message) {
+  const int line = tuvo_test::SourceLine("db/object_db.cpp",
+                                         "SHARING_LOG_PID(\"" + message + "\\n\");", function);
+  return "user.err object_db:" + std::to_string(line) + " (" + std::to_string(getpid()) + ") " +
+         message + "\n";
+}
+
+constexpr char kCreate[] = "bool ObjectDB::Create(";
+constexpr char kUpdate[] = "bool ObjectDB::Update(";
+constexpr char kDelete[] = "bool ObjectDB::Delete(int";
 
 // Keeps the ids that it was asked to delete instead of deleting them.
 class KeepingDB : public ThingDB {
@@ -172,6 +199,31 @@ TEST_F(ObjectDBTest, ItsEndOnADatabaseThatIsNotGoodSaysSo) {
   EXPECT_EQ(TakeLines(listener_), Lines{"base_db:LINE (PID) db is not good.\n\n"});
 }
 
+// Programs have stores of their own, with the base's members and operations in these places.
+TEST_F(ObjectDBTest, MembersStandInTheirOrder) {
+  const ObjectDB& store = *store_;
+  static_assert(std::is_same_v<tuvo_test::TypesOf<decltype(MembersOf(store))>,
+                               std::tuple<BaseDB*, const char*, int, std::unique_ptr<Condition>>>);
+  static_assert(sizeof(std::unique_ptr<Condition>) == sizeof(Condition*));
+  EXPECT_TRUE(tuvo_test::StandInThisOrder(store, MembersOf(store)));
+  EXPECT_EQ(store.*std::get<2>(MembersOf(store)), 1);
+}
+
+TEST_F(ObjectDBTest, OperationsHaveTheirPlacesInTheTable) {
+  if (!tuvo_test::kTablesCanBeRead) {
+    GTEST_SKIP() << "on this processor tables are read in another way";
+  }
+  // The destructor takes the first two.
+  EXPECT_EQ(Slot(&ObjectDB::Create), 2U);
+  EXPECT_EQ(Slot(&ObjectDB::Update), 3U);
+  EXPECT_EQ(Slot(static_cast<bool (ObjectDB::*)(int)>(&ObjectDB::Delete)), 4U);
+  EXPECT_EQ(Slot(static_cast<bool (ObjectDB::*)(const Object&)>(&ObjectDB::Delete)), 5U);
+  EXPECT_EQ(Slot(&ObjectDB::GetById), 6U);
+  EXPECT_EQ(Slot(&ObjectDB::Count), 7U);
+  EXPECT_EQ(tuvo_test::SlotCount<ThingDB>(), 8U);
+  EXPECT_EQ(Slot(&ObjectDB::GetCondition), tuvo_test::kNotVirtual);
+}
+
 // --- Create -----------------------------------------------------------------------------------
 
 TEST_F(ObjectDBTest, CreateInsertsTheValuesInOrderAndSetsTheId) {
@@ -199,7 +251,7 @@ TEST_F(ObjectDBTest, CreateOfAnIllegalRecordRunsNothingAndKeepsTheId) {
   EXPECT_FALSE(store_->Create(thing));
   EXPECT_EQ(Seen(), nothing_);
   EXPECT_EQ(thing.get_id(), 500);
-  EXPECT_EQ(TakeLines(listener_), Lines{"object_db:LINE (PID) obj invalid\n"});
+  EXPECT_EQ(TakeWritten(listener_), Lines{LineOf(kCreate, "obj invalid")});
 }
 
 TEST_F(ObjectDBTest, AFailedInsertIsLoggedAndKeepsTheId) {
@@ -209,18 +261,8 @@ TEST_F(ObjectDBTest, AFailedInsertIsLoggedAndKeepsTheId) {
   same.set_id(500);
   EXPECT_FALSE(store_->Create(same));
   EXPECT_EQ(same.get_id(), 500);
-  EXPECT_EQ(TakeLines(listener_), Lines{"object_db:LINE (PID) insert failed\n"});
+  EXPECT_EQ(TakeWritten(listener_), Lines{LineOf(kCreate, "insert failed")});
   EXPECT_EQ(db_.GetLastError(), "UNIQUE constraint failed: thing.name");
-}
-
-TEST_F(ObjectDBTest, TheLinesHaveTheDefaultFacilityPriorityErrorAndThisProcessesId) {
-  Thing thing("", "");
-  EXPECT_FALSE(store_->Create(thing));
-  const std::vector<LogLine> lines = listener_.Take();
-  ASSERT_EQ(lines.size(), 1U);
-  EXPECT_EQ(lines[0].facility, LOG_USER);
-  EXPECT_EQ(lines[0].priority, LOG_ERR);
-  EXPECT_EQ(tuvo_test::Normalized(lines[0].text), "object_db:LINE (PID) obj invalid\n");
 }
 
 // --- Update -----------------------------------------------------------------------------------
@@ -241,7 +283,7 @@ TEST_F(ObjectDBTest, UpdateOfAnIllegalRecordRunsNothing) {
   thing.set_id(2);
   EXPECT_FALSE(store_->Update(thing));
   EXPECT_EQ(Seen(), nothing_);
-  EXPECT_EQ(TakeLines(listener_), Lines{"object_db:LINE (PID) obj invalid\n"});
+  EXPECT_EQ(TakeWritten(listener_), Lines{LineOf(kUpdate, "obj invalid")});
 }
 
 TEST_F(ObjectDBTest, AFailedUpdateIsLogged) {
@@ -249,7 +291,7 @@ TEST_F(ObjectDBTest, AFailedUpdateIsLogged) {
   Thing thing("a", "taken by row 1");
   thing.set_id(2);
   EXPECT_FALSE(store_->Update(thing));
-  EXPECT_EQ(TakeLines(listener_), Lines{"object_db:LINE (PID) update failed\n"});
+  EXPECT_EQ(TakeWritten(listener_), Lines{LineOf(kUpdate, "update failed")});
 }
 
 TEST_F(ObjectDBTest, UpdateOfNoRowSucceeds) {
@@ -287,7 +329,7 @@ TEST_F(ObjectDBTest, AFailedDeleteIsLogged) {
   ASSERT_TRUE(db_.Execute("DROP TABLE thing"));
   EXPECT_FALSE(store_->Delete(1));
   EXPECT_FALSE(store_->Delete(Thing()));
-  EXPECT_EQ(TakeLines(listener_), Lines(2, "object_db:LINE (PID) delete failed\n"));
+  EXPECT_EQ(TakeWritten(listener_), Lines(2, LineOf(kDelete, "delete failed")));
 }
 
 TEST_F(ObjectDBTest, DeleteByRecordReachesAStoresOwnDeleteById) {

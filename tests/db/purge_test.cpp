@@ -56,9 +56,9 @@ TEST_F(Purge, TheStatementNamesTheTableAndQuotesTheSecond) {
 // The text of the time must be compared as a number, whatever its number of digits.
 TEST_F(Purge, TheQuotedTimeIsComparedAsANumber) {
   Add(9);
-  Add(99999999999);
+  Add(2147483647);
   EXPECT_TRUE(PurgeTimedOut(db_, "thing", 1.0F));
-  EXPECT_EQ(SqliteFile(kPath).Value("SELECT timeout FROM thing"), "99999999999");
+  EXPECT_EQ(SqliteFile(kPath).Value("SELECT timeout FROM thing"), "2147483647");
 }
 
 TEST_F(Purge, ARowWithoutATimeoutStays) {

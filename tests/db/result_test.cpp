@@ -9,6 +9,16 @@
 #include <utility>
 #include <vector>
 
+#include "support/class_layout.h"
+
+namespace tuvo_test {
+
+using TUVO::sharing::db::Result;
+auto MembersOf(const Result&);
+template struct Reveal<Result, &Result::row_, &Result::result_>;
+
+}  // namespace tuvo_test
+
 // Three rows, number 10, 20 and 30.
 struct DBResult_tag {
   std::vector<unsigned int> rows{10, 20, 30};
@@ -18,7 +28,9 @@ struct DBResult_tag {
 namespace {
 
 std::vector<DBResult_tag*> freed;
-std::vector<unsigned int> cursors;  // as they came in with each step
+int row_answer = 0;                          // for a row that is there
+std::vector<const DBResult_tag*> read_from;  // whose fields were asked for
+std::vector<unsigned int> cursors;           // as they came in with each step
 std::vector<const DBResult_tag*> walked;
 
 }  // namespace
@@ -32,19 +44,18 @@ int TUVODBFetchRow(DBResult_tag* result, unsigned int* row) {
     return -1;
   }
   *row = result->rows[result->next++];
-  return 0;
+  return row_answer;
 }
 
-const char* TUVODBFetchField(DBResult_tag* /*result*/, unsigned int row, const char* name) {
+const char* TUVODBFetchField(DBResult_tag* result, unsigned int row, const char* name) {
+  read_from.push_back(result);
   static std::string text;
   text = std::to_string(row) + name;
   return text.c_str();
 }
 
 void TUVODBFreeResult(DBResult_tag* result) {
-  if (result != nullptr) {
-    freed.push_back(result);
-  }
+  freed.push_back(result);
 }
 
 }  // extern "C"
@@ -53,6 +64,7 @@ namespace {
 
 using TUVO::sharing::db::Result;
 using TUVO::sharing::db::Row;
+using tuvo_test::MembersOf;
 
 class ResultTest : public testing::Test {
  protected:
@@ -60,6 +72,8 @@ class ResultTest : public testing::Test {
     freed.clear();
     cursors.clear();
     walked.clear();
+    read_from.clear();
+    row_answer = 0;
   }
 
   static std::string Number(const Row& row) { return row.GetField("").AsString(""); }
@@ -145,11 +159,41 @@ TEST_F(ResultTest, BehindTheLastRowTheRowIsLeftAsItWas) {
 }
 
 TEST_F(ResultTest, EveryAnswerButMinusOneIsARow) {
-  handle_.rows = {0};
+  handle_.rows = {0, 1, 2, 3};
+  Result result(&handle_);
+  Row row;
+  for (const int answer : {0, 1, -2, 101}) {
+    row_answer = answer;
+    EXPECT_TRUE(result.NextRow(row)) << answer;
+  }
+  EXPECT_EQ(Number(row), "3");
+}
+
+// A Result serves one statement; whoever gives it another handle goes on where the first stopped.
+TEST_F(ResultTest, AnotherHandleLeavesTheCursor) {
   Result result(&handle_);
   Row row;
   EXPECT_TRUE(result.NextRow(row));
-  EXPECT_EQ(Number(row), "0");
+  result.SetResult(&other_);
+  EXPECT_TRUE(result.NextRow(row));
+  EXPECT_EQ(cursors, (std::vector<unsigned int>{0, 10}));
+  EXPECT_EQ(walked.back(), &other_);
+}
+
+TEST_F(ResultTest, ARowAsksItsResultForAFieldAndWithoutOneNobody) {
+  EXPECT_EQ(Row(&handle_, 7).GetField("name").AsString(""), "7name");
+  EXPECT_EQ(Row(nullptr, 7).GetField("name").AsString(""), "");
+  EXPECT_EQ(Row().GetField("name").AsString(""), "");
+  EXPECT_EQ(read_from, std::vector<const DBResult_tag*>{&handle_});
+}
+
+TEST_F(ResultTest, ItsTableHasTheDestructorAloneAndTheCursorStandsBeforeTheHandle) {
+  const Result result;
+  EXPECT_TRUE(std::has_virtual_destructor_v<Result>);
+  EXPECT_TRUE(tuvo_test::StandInThisOrder(result, MembersOf(result)));
+  if (tuvo_test::kTablesCanBeRead) {
+    EXPECT_EQ(tuvo_test::SlotCount<Result>(), 2U);
+  }
 }
 
 TEST_F(ResultTest, CannotBeCopied) {

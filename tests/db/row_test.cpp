@@ -4,11 +4,23 @@
 
 #include <memory>
 #include <string>
+#include <type_traits>
+
+#include "support/class_layout.h"
+
+namespace tuvo_test {
+
+using TUVO::sharing::db::Row;
+auto MembersOf(const Row&);
+template struct Reveal<Row, &Row::result_, &Row::row_>;
+
+}  // namespace tuvo_test
 
 namespace {
 
 using TUVO::sharing::db::Field;
 using TUVO::sharing::db::Row;
+using tuvo_test::MembersOf;
 
 // Two rows of an SQLite database in memory.
 class RowTest : public testing::Test {
@@ -96,6 +108,15 @@ TEST_F(RowTest, ACopyIsAnotherViewOfTheSameRow) {
 TEST_F(RowTest, TheResultIsBorrowed) {
   { const Row row(result_.get(), 0); }
   EXPECT_EQ(Text(Row(result_.get(), 0), "id"), "1");
+}
+
+TEST_F(RowTest, ItsTableHasTheDestructorAloneAndTheResultStandsBeforeTheNumber) {
+  const Row row;
+  EXPECT_TRUE(std::has_virtual_destructor_v<Row>);
+  EXPECT_TRUE(tuvo_test::StandInThisOrder(row, MembersOf(row)));
+  if (tuvo_test::kTablesCanBeRead) {
+    EXPECT_EQ(tuvo_test::SlotCount<Row>(), 2U);
+  }
 }
 
 TEST_F(RowTest, EachFieldIsAFreshOne) {

@@ -2,14 +2,14 @@
 #include <gtest/gtest.h>
 #include <internal/run_as.h>
 #include <syslog.h>
+#include <unistd.h>
 
 #include <cerrno>
-#include <functional>
 #include <stdexcept>
 #include <string>
 #include <vector>
 
-#include "log_lines.h"
+#include "identity_lines.h"
 #include "support/child.h"
 #include "support/seccomp_filter.h"
 #include "support/syslog_listener.h"
@@ -24,14 +24,15 @@ using tuvo_test::kSavedRoot;
 using tuvo_test::kSetresgid;
 using tuvo_test::kSetresuid;
 using tuvo_test::kSystem;
-using tuvo_test::LogLine;
 using tuvo_test::RefuseCalls;
 using tuvo_test::RunInChildAs;
 using tuvo_test::SyslogListener;
+using tuvo_test::TakeWritten;
 using tuvo_test::ToText;
 using Lines = std::vector<std::string>;
 
 // The ids under which the statement's body ran; "failed" when the other branch was taken.
+const std::string kSeenAs = "run_as_test:" + std::to_string(__LINE__ + 2);
 std::string SeenAs(uid_t uid, gid_t gid) {
   IF_RUN_AS(uid, gid) {
     return ToText(CurrentIds());
@@ -59,11 +60,11 @@ void ExpectSwitch(const Ids& start, uid_t uid, gid_t gid) {
                            return 0;
                          }),
             0);
-  EXPECT_EQ(tuvo_test::TakeLines(listener), Lines{});
+  EXPECT_EQ(TakeWritten(listener), Lines{});
 }
 
 // Switches in a child that starts as `start` and expects a failure with its one line.
-void ExpectFailure(const Ids& start, uid_t uid, gid_t gid, const std::string& line) {
+void ExpectFailure(const Ids& start, uid_t uid, gid_t gid, const std::string& text) {
   SyslogListener listener;
   EXPECT_EQ(RunInChildAs(start,
                          [&] {
@@ -72,11 +73,7 @@ void ExpectFailure(const Ids& start, uid_t uid, gid_t gid, const std::string& li
                            return 0;
                          }),
             0);
-  const std::vector<LogLine> lines = listener.Take();
-  ASSERT_EQ(lines.size(), 1U);
-  EXPECT_EQ(tuvo_test::Normalized(lines[0].text), line);
-  EXPECT_EQ(lines[0].facility, LOG_AUTH);
-  EXPECT_EQ(lines[0].priority, LOG_ERR);
+  EXPECT_EQ(TakeWritten(listener), Lines{"auth.err " + kSeenAs + text});
 }
 
 TEST(RunAs, RootTakesTheSystemIdentityAndReturns) {
@@ -92,7 +89,7 @@ TEST(RunAs, TheSystemIdentityStaysWhatItIs) {
 }
 
 TEST(RunAs, NobodyCannotTakeTheSystemIdentity) {
-  ExpectFailure(kNobody, 1, 1, "run_as_test:LINE ERROR: IF_RUN_AS(1, 1)");
+  ExpectFailure(kNobody, 1, 1, " ERROR: IF_RUN_AS(1, 1)");
 }
 
 TEST(RunAs, RootStaysRoot) {
@@ -104,11 +101,19 @@ TEST(RunAs, SavedRootTakesRootAndReturns) {
 }
 
 TEST(RunAs, TheSystemIdentityCannotTakeRoot) {
-  ExpectFailure(kSystem, 0, 0, "run_as_test:LINE ERROR: IF_RUN_AS(0, 0)");
+  ExpectFailure(kSystem, 0, 0, " ERROR: IF_RUN_AS(0, 0)");
 }
 
 TEST(RunAs, NobodyCannotTakeRoot) {
-  ExpectFailure(kNobody, 0, 0, "run_as_test:LINE ERROR: IF_RUN_AS(0, 0)");
+  ExpectFailure(kNobody, 0, 0, " ERROR: IF_RUN_AS(0, 0)");
+}
+
+TEST(RunAs, OtherIdsAreTakenEachInItsPlace) {
+  ExpectSwitch(kSavedRoot, 2001, 3001);
+}
+
+TEST(RunAs, OtherIdsThatCannotBeTakenAreLoggedEachInItsPlace) {
+  ExpectFailure(kNobody, 2001, 3001, " ERROR: IF_RUN_AS(2001, 3001)");
 }
 
 TEST(RunAs, TheSystemIdentityWithSavedRootTakesRootAndReturns) {
@@ -129,12 +134,12 @@ TEST(RunAs, OnlyTheGidDiffers) {
 
 // Only root may take any group, and the uid asked for is in force already: root is not regained.
 TEST(RunAs, TheRightUidWithAForeignGidFailsEvenWithSavedRoot) {
-  ExpectFailure({1, 1, 0, 5, 5, 5}, 1, 1, "run_as_test:LINE ERROR: IF_RUN_AS(1, 1)");
+  ExpectFailure({1, 1, 0, 5, 5, 5}, 1, 1, " ERROR: IF_RUN_AS(1, 1)");
 }
 
 // The way goes through root alone.
 TEST(RunAs, ARealOrSavedUidThatIsTheOneAskedForIsNoWay) {
-  ExpectFailure({1, 65534, 1, 1, 65534, 1}, 1, 1, "run_as_test:LINE ERROR: IF_RUN_AS(1, 1)");
+  ExpectFailure({1, 65534, 1, 1, 65534, 1}, 1, 1, " ERROR: IF_RUN_AS(1, 1)");
 }
 
 TEST(RunAs, UnderTheSystemIdentityNoIdIsEverTouched) {
@@ -143,30 +148,28 @@ TEST(RunAs, UnderTheSystemIdentityNoIdIsEverTouched) {
   }
   EXPECT_EQ(RunInChildAs(kSystem,
                          [] {
-                           EXPECT_TRUE(RefuseCalls({{kSetresuid, tuvo_test::kKill},
-                                                    {kSetresgid, tuvo_test::kKill},
-                                                    {__NR_setuid, tuvo_test::kKill},
-                                                    {__NR_setgid, tuvo_test::kKill},
-                                                    {__NR_setreuid, tuvo_test::kKill},
-                                                    {__NR_setregid, tuvo_test::kKill}}));
+                           EXPECT_TRUE(tuvo_test::EndAtIdChanges());
                            EXPECT_EQ(SeenAs(1, 1), ToText(kSystem));
                            return 0;
                          }),
             0);
 }
 
-// The filter of the test above does end a process that changes its ids.
+// The filter of the test above ends a process at each of them.
 TEST(RunAs, AForbiddenCallIsSeen) {
   if (!tuvo_test::CanRefuseCalls()) {
     GTEST_SKIP() << "this system has no system call filters";
   }
-  EXPECT_EQ(RunInChildAs(kRoot,
-                         [] {
-                           EXPECT_TRUE(RefuseCalls({{kSetresgid, tuvo_test::kKill}}));
-                           SeenAs(1, 1);
-                           return 0;
-                         }),
-            256 + SIGSYS);
+  for (const long call : tuvo_test::kIdChanges) {
+    EXPECT_EQ(RunInChildAs(kSystem,
+                           [&] {
+                             EXPECT_TRUE(tuvo_test::EndAtIdChanges());
+                             syscall(call, 1, 1, 1);
+                             return 0;
+                           }),
+              256 + SIGSYS)
+        << call;
+  }
 }
 
 TEST(RunAs, LeavingTheBodyByReturnPutsTheIdsBack) {
@@ -226,22 +229,55 @@ TEST(RunAs, ErrnoOfTheBodySurvivesTheReturn) {
             0);
 }
 
-// A child's status holds no more than a byte.
-constexpr int kLineBase = __LINE__;
-
-// The line of the switch in this function; 0 when it succeeded.
-int FailingLine() {
-  IF_RUN_AS(1, 1) {
-    return 0;
+TEST(RunAs, ASwitchAndItsReturnLeaveErrno) {
+  for (const Ids& start : {kRoot, kSavedRoot, kSystem}) {
+    EXPECT_EQ(RunInChildAs(start,
+                           [] {
+                             errno = EDOM;
+                             IF_RUN_AS(1, 1) {
+                               EXPECT_EQ(errno, EDOM);
+                             }
+                             EXPECT_EQ(errno, EDOM);
+                             return 0;
+                           }),
+              0);
   }
-  return __LINE__ - 3;
 }
 
-TEST(RunAs, TheLineNamesTheFileAndLineOfTheSwitch) {
+// Nobody listens to the log, so writing the line fails, for reasons of its own.
+TEST(RunAs, TheReasonOfAFailureIsThereInTheOtherBranchAndAfterIt) {
+  EXPECT_EQ(RunInChildAs(kNobody,
+                         [] {
+                           errno = 0;
+                           IF_RUN_AS(1, 1) {
+                             return 1;
+                           }
+                           else {
+                             EXPECT_EQ(errno, EPERM);
+                           }
+                           EXPECT_EQ(errno, EPERM);
+                           return 0;
+                         }),
+            0);
+}
+
+// No filter is needed to close the way back.
+TEST(RunAs, ABodyThatGivesRootUpLeavesErrnoAndTheLineOfAFailedReturn) {
+  constexpr int kGiveUpLine = __LINE__ + 2;
+  const auto give_up = [] {
+    IF_RUN_AS(1, 1) {
+      EXPECT_EQ(setresuid(1, 1, 1), 0);
+      errno = EDOM;
+    }
+    EXPECT_EQ(errno, EDOM);
+    EXPECT_EQ(ToText(CurrentIds()), ToText({1, 1, 1, 65534, 1, 0}));
+    return 0;
+  };
+  EXPECT_EQ(RunInChildAs(kSavedRoot, give_up), 0) << "while nobody listens to the log";
   SyslogListener listener;
-  const int line = RunInChildAs(kNobody, [] { return FailingLine() - kLineBase; }) + kLineBase;
-  EXPECT_EQ(listener.TakeTexts(),
-            (Lines{"run_as_test:" + std::to_string(line) + " ERROR: IF_RUN_AS(1, 1)"}));
+  EXPECT_EQ(RunInChildAs(kSavedRoot, give_up), 0);
+  EXPECT_EQ(TakeWritten(listener), Lines{"auth.crit run_as_test:" + std::to_string(kGiveUpLine) +
+                                         " ERROR: ~IF_RUN_AS(65534, 65534)"});
 }
 
 // The facility of the program has no say in what concerns identities.
@@ -253,9 +289,17 @@ TEST(RunAs, TheLineGoesToTheAuthorisationFacilityWhateverTheProgramChose) {
                            return SeenAs(1, 1) == "failed" ? 0 : 1;
                          }),
             0);
-  const std::vector<LogLine> lines = listener.Take();
-  ASSERT_EQ(lines.size(), 1U);
-  EXPECT_EQ(lines[0].facility, LOG_AUTH);
+  EXPECT_EQ(TakeWritten(listener), Lines{"auth.err " + kSeenAs + " ERROR: IF_RUN_AS(1, 1)"});
+}
+
+// Meets the refusal on the way back alone.
+const std::string kReturnInto = "run_as_test:" + std::to_string(__LINE__ + 2);
+void ReturnInto(const tuvo_test::Refusal& refusal) {
+  IF_RUN_AS(1, 1) {
+    EXPECT_TRUE(RefuseCalls({refusal}));
+    errno = EDOM;
+  }
+  EXPECT_EQ(errno, EDOM);
 }
 
 // Each call that the switch makes refused in turn, in a child that starts as saved root.
@@ -284,7 +328,7 @@ class RunAsRefused : public testing::Test {
                              return 0;
                            }),
               0);
-    return Described(listener);
+    return TakeWritten(listener);
   }
 
   // What is logged when only the return meets it, and the ids that the process is left with.
@@ -293,33 +337,17 @@ class RunAsRefused : public testing::Test {
     SyslogListener listener;
     EXPECT_EQ(RunInChildAs(start,
                            [&] {
-                             IF_RUN_AS(1, 1) {
-                               EXPECT_TRUE(RefuseCalls({refusal}));
-                               errno = EDOM;
-                             }
-                             EXPECT_EQ(errno, EDOM);
+                             ReturnInto(refusal);
                              EXPECT_EQ(ToText(CurrentIds()), left);
                              return 0;
                            }),
               0);
-    return Described(listener);
-  }
-
-  static Lines Described(SyslogListener& listener) {
-    Lines described;
-    for (const LogLine& line : listener.Take()) {
-      described.push_back((line.facility == LOG_AUTH ? "auth " : "? ") +
-                          std::string(line.priority == LOG_ERR    ? "error "
-                                      : line.priority == LOG_CRIT ? "critical "
-                                                                  : "? ") +
-                          tuvo_test::Normalized(line.text));
-    }
-    return described;
+    return TakeWritten(listener);
   }
 };
 
-const Lines kSwitchLine{"auth error run_as_test:LINE ERROR: IF_RUN_AS(1, 1)"};
-const Lines kReturnLine{"auth critical run_as_test:LINE ERROR: ~IF_RUN_AS(65534, 65534)"};
+const Lines kSwitchLine{"auth.err " + kSeenAs + " ERROR: IF_RUN_AS(1, 1)"};
+const Lines kReturnLine{"auth.crit " + kReturnInto + " ERROR: ~IF_RUN_AS(65534, 65534)"};
 
 TEST_F(RunAsRefused, RegainingRootFailsTheSwitch) {
   EXPECT_EQ(SwitchUnder(Setting(kSetresuid, 0)), kSwitchLine);
@@ -350,13 +378,13 @@ TEST_F(RunAsRefused, AReturnThatCannotTakeTheUserIsLogged) {
 
 TEST_F(RunAsRefused, AReturnToRootIsLoggedWithRootsIds) {
   EXPECT_EQ(ReturnUnder(Setting(kSetresuid, 0), kRoot, Effective(kRoot, 1, 1)),
-            Lines{"auth critical run_as_test:LINE ERROR: ~IF_RUN_AS(0, 0)"});
+            Lines{"auth.crit " + kReturnInto + " ERROR: ~IF_RUN_AS(0, 0)"});
 }
 
 TEST_F(RunAsRefused, IdsAreWrittenAsSignedNumbers) {
   const Ids start{4294967294U, 4294967294U, 0, 4294967293U, 4294967293U, 0};
   EXPECT_EQ(ReturnUnder(Setting(kSetresuid, 0), start, Effective(start, 1, 1)),
-            Lines{"auth critical run_as_test:LINE ERROR: ~IF_RUN_AS(-2, -3)"});
+            Lines{"auth.crit " + kReturnInto + " ERROR: ~IF_RUN_AS(-2, -3)"});
 }
 
 TEST_F(RunAsRefused, AFailedReturnOfAFailedSwitchIsLoggedToo) {
@@ -370,7 +398,8 @@ TEST_F(RunAsRefused, AFailedReturnOfAFailedSwitchIsLoggedToo) {
                      return 0;
                    }),
       0);
-  EXPECT_EQ(Described(listener), (Lines{kSwitchLine[0], kReturnLine[0]}));
+  EXPECT_EQ(TakeWritten(listener),
+            (Lines{kSwitchLine[0], "auth.crit " + kSeenAs + " ERROR: ~IF_RUN_AS(65534, 65534)"}));
 }
 
 }  // namespace

@@ -2,6 +2,11 @@
 #include <gtest/gtest.h>
 #include <unistd.h>
 
+#include <chrono>
+#include <stdexcept>
+#include <string>
+#include <thread>
+
 #include "sqlite_file.h"
 
 namespace {
@@ -218,6 +223,33 @@ TEST(SchemaVersion, AScriptThatDoesNotReachItsEndLeavesTheFileAsItWas) {
     db.Execute("ROLLBACK");
     EXPECT_EQ(db.Value("PRAGMA user_version"), std::to_string(version - 1));
     EXPECT_EQ(db.Rows("SELECT name, sql FROM sqlite_schema ORDER BY name"), before);
+  }
+}
+
+// A script that had begun reading while another program writes could not write any more: what it
+// read would be out of date. It must take its turn from the start.
+TEST(SchemaVersion, AScriptWaitsForAnotherProgramThatWrites) {
+  for (const int version : {1, 2}) {
+    unlink(kPath);
+    SqliteFile writer(kPath);
+    writer.Execute("PRAGMA journal_mode = WAL");
+    writer.Execute(SchemaScript(1) + SchemaScript(2));
+    writer.Execute("BEGIN IMMEDIATE; INSERT INTO entry (hash) VALUES ('e')");
+    std::string reason;
+    std::thread other([&] {
+      try {
+        SqliteFile db(kPath);
+        db.Execute("PRAGMA busy_timeout = 10000");
+        db.Execute(SchemaScript(version));
+      } catch (const std::runtime_error& error) {
+        reason = error.what();
+      }
+    });
+    std::this_thread::sleep_for(std::chrono::milliseconds(300));
+    writer.Execute("COMMIT");
+    other.join();
+    EXPECT_EQ(reason, "") << version;
+    EXPECT_EQ(writer.Value("PRAGMA user_version"), std::to_string(version));
   }
 }
 

@@ -10,10 +10,13 @@
 #include <string>
 #include <vector>
 
-#include "log_lines.h"
+#include "identity_lines.h"
+#include "sharing_lines.h"
+#include "sqlite_file.h"
 #include "support/child.h"
 #include "support/seccomp_filter.h"
 #include "support/syslog_listener.h"
+#include "support/written_line.h"
 #include "test_files.h"
 
 namespace {
@@ -54,9 +57,16 @@ namespace {
 
 using TUVO::sharing::db::SharingDB;
 using tuvo_test::NewPath;
+using tuvo_test::Place;
+using tuvo_test::ReturnFailed;
+using tuvo_test::SwitchFailed;
 using tuvo_test::SyslogListener;
-using tuvo_test::TakeLines;
+using tuvo_test::TakeWritten;
 using Lines = std::vector<std::string>;
+
+constexpr char kSource[] = "db/sharing_db.cpp";
+constexpr char kMigration[] = "bool SharingDBPrivate::Migration(";
+constexpr char kMigrateTo[] = "bool SharingDBPrivate::MigrateTo(";
 
 class SharingDBPlatform : public testing::Test {
  protected:
@@ -81,15 +91,21 @@ class SharingDBPlatform : public testing::Test {
 TEST_F(SharingDBPlatform, AVersionThatCannotBeAskedForFails) {
   failing_statement = "PRAGMA user_version";
   ExpectNotMigrated();
-  EXPECT_EQ(TakeLines(listener_),
-            Lines{"sharing_db:LINE (PID) Failed [!pdb_->Execute(\"PRAGMA user_version\", result)], "
-                  "err=Input/output error\n\n"});
+  EXPECT_EQ(TakeWritten(listener_), Lines{tuvo_test::VersionNotAsked("Input/output error")});
 }
 
 TEST_F(SharingDBPlatform, AVersionWithoutARowFails) {
   no_row = true;
   ExpectNotMigrated();
-  EXPECT_EQ(TakeLines(listener_), Lines{"sharing_db:LINE (PID) user_version is not correct\n\n"});
+  EXPECT_EQ(TakeWritten(listener_), Lines{tuvo_test::NoVersion()});
+}
+
+TEST_F(SharingDBPlatform, AScriptThatFailsIsLoggedWithTheSystemsReason) {
+  failing_statement = tuvo_test::SchemaScript(2);
+  const SharingDB db(path_);
+  EXPECT_FALSE(db.IsGood());
+  EXPECT_EQ(TakeWritten(listener_),
+            (Lines{tuvo_test::ScriptFailed("Input/output error"), tuvo_test::CannotMigrate(1, 2)}));
 }
 
 // The identity is lost between the question for the version and the first script.
@@ -110,9 +126,31 @@ TEST_F(SharingDBPlatform, AScriptThatCannotBeReadAsTheSystemFails) {
                                       return 0;
                                     }),
             0);
-  EXPECT_EQ(TakeLines(listener_), (Lines{"sharing_db:LINE ERROR: IF_RUN_AS(1, 1)",
-                                         "sharing_db:LINE (PID) failed to run as system\n\n",
-                                         "sharing_db:LINE (PID) cannot migrate from 0 to 1\n\n"}));
+  const std::string pid = " (" + std::to_string(tuvo_test::LastChild()) + ") ";
+  EXPECT_EQ(
+      TakeWritten(listener_),
+      (Lines{SwitchFailed(kSource, kMigrateTo, "1, 1"),
+             "user.err " + Place(kSource, "SHARING_LOG_PID(\"failed to run as system", kMigrateTo) +
+                 pid + "failed to run as system\n\n",
+             "user.err " + Place(kSource, "SHARING_LOG_PID(\"cannot migrate", kMigration) + pid +
+                 "cannot migrate from 0 to 1\n\n"}));
+}
+
+// The script is read all the same; later switches start from the ids that the return ended with.
+TEST_F(SharingDBPlatform, AReturnRefusedAfterOpeningAScriptIsLoggedWithThePlaceOfItsSwitch) {
+  if (!tuvo_test::CanRefuseCalls()) {
+    GTEST_SKIP() << "this system has no system call filters";
+  }
+  at_first_row = [] {
+    EXPECT_TRUE(tuvo_test::RefuseCalls({{tuvo_test::kSetresuid, EPERM, 1, 65534}}));
+  };
+  EXPECT_EQ(tuvo_test::RunInChildAs(tuvo_test::kSavedRoot,
+                                    [&] {
+                                      EXPECT_TRUE(SharingDB(path_).IsGood());
+                                      return 0;
+                                    }),
+            0);
+  EXPECT_EQ(TakeWritten(listener_), Lines{ReturnFailed(kSource, kMigrateTo, "65534, 65534")});
 }
 
 }  // namespace

@@ -11,12 +11,12 @@
 #include <locale>
 #include <memory>
 #include <string>
-#include <type_traits>
 #include <vector>
 
 #include "log_lines.h"
 #include "sqlite_file.h"
 #include "statement_time.h"
+#include "store_layout.h"
 #include "store_records.h"
 #include "support/syslog_listener.h"
 #include "test_files.h"
@@ -97,10 +97,10 @@ class TokenDBTest : public testing::Test {
 
 TEST_F(TokenDBTest, CreateStoresTheTokenAndSetsItsId) {
   Token token = LegalToken(2, 1);
-  token.set_timeout(4000000000);
+  token.set_timeout(2000000000);
   EXPECT_TRUE(store_->Create(token));
   EXPECT_EQ(token.get_id(), 1);
-  EXPECT_EQ(Seen(), "INSERT INTO token VALUES (NULL,'2','1','4000000000')");
+  EXPECT_EQ(Seen(), "INSERT INTO token VALUES (NULL,'2','1','2000000000')");
 }
 
 TEST_F(TokenDBTest, ATokenThatTimedOutOrBelongsToNothingIsRefused) {
@@ -124,13 +124,13 @@ TEST_F(TokenDBTest, ATokenOfALinkThatDoesNotExistIsRefusedByTheDatabase) {
 TEST_F(TokenDBTest, UpdateWritesTheTokenToItsRow) {
   Token token = LegalToken(1, 2);
   ASSERT_TRUE(store_->Create(token));
-  token.set_timeout(4000000000);
+  token.set_timeout(2000000000);
   EXPECT_TRUE(store_->Update(token));
-  EXPECT_EQ(Seen(), "UPDATE token SET entry_id='1',session_id='2',timeout='4000000000' WHERE id=1");
+  EXPECT_EQ(Seen(), "UPDATE token SET entry_id='1',session_id='2',timeout='2000000000' WHERE id=1");
   Token found;
   EXPECT_TRUE(store_->GetById(1, found));
   EXPECT_EQ(Seen(), "SELECT * FROM token WHERE id = 1");
-  EXPECT_EQ(found.get_timeout(), 4000000000);
+  EXPECT_EQ(found.get_timeout(), 2000000000);
 }
 
 TEST_F(TokenDBTest, DeleteWorksByIdAndByRecord) {
@@ -168,11 +168,11 @@ TEST_F(TokenDBTest, ItsEndRunsACheckpoint) {
   EXPECT_EQ(db_.GetLastQuery(), "PRAGMA wal_checkpoint;");
 }
 
-TEST_F(TokenDBTest, TheStoreIsAnObjectDBBehindAHandle) {
-  static_assert(std::is_base_of_v<ObjectDB, TokenDBPrivate>);
-  static_assert(sizeof(TokenDBPrivate) == sizeof(ObjectDB), "adds no members");
-  static_assert(sizeof(TokenDB) == 2 * sizeof(void*), "one pointer beside the virtual table's");
-  static_assert(std::has_virtual_destructor_v<TokenDB>);
+TEST_F(TokenDBTest, TheStoreHasTheTableOfAllStoresBehindAHandle) {
+  tuvo_test::ExpectTablesOfAStore<TokenDB, TokenDBPrivate>(db_);
+}
+
+TEST_F(TokenDBTest, TheStoreIsDeletedFromThroughItsBase) {
   TokenDBPrivate store(db_);
   EXPECT_TRUE(static_cast<ObjectDB&>(store).Delete(7));
   EXPECT_EQ(Seen(), "DELETE FROM token WHERE id=7");
@@ -284,6 +284,18 @@ TEST_F(TokenDBTest, ThePurgeDeletesWhatTimedOutBeforeThisSecond) {
   SqliteFile file(kPath);
   EXPECT_EQ(file.Value("SELECT COUNT(*) FROM token"), "2");
   EXPECT_EQ(file.Value("SELECT MIN(timeout) FROM token"), std::to_string(second));
+}
+
+// The token itself counts as timed out in that second.
+TEST_F(TokenDBTest, ATokenOfThisVerySecondIsRefusedButNotPurged) {
+  tuvo_test::WithinOneSecond([&](std::time_t now) {
+    ASSERT_TRUE(db_.Execute("DELETE FROM token"));
+    AddRow(now);
+    EXPECT_TRUE(store_->PurgeExpired(1.0F));
+    Token token;
+    EXPECT_FALSE(store_->GetBySessionEntry(sessions_[0], entries_[0], token));
+    EXPECT_EQ(token.get_session_id(), 1);
+  });
 }
 
 TEST_F(TokenDBTest, ThePurgesStatementQuotesTheTime) {

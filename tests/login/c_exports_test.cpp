@@ -13,12 +13,24 @@ namespace {
 using Params = _tag_sharing_login_params;
 
 static_assert(std::is_standard_layout_v<Params> && std::is_trivial_v<Params>);
-static_assert(offsetof(Params, sharing_id) == 0 * sizeof(char*) &&
-              offsetof(Params, password) == 1 * sizeof(char*) &&
-              offsetof(Params, zor_username) == 2 * sizeof(char*) &&
-              offsetof(Params, zor_password) == 3 * sizeof(char*) &&
-              offsetof(Params, sharing_sid) == 4 * sizeof(char*) &&
-              sizeof(Params) == 5 * sizeof(char*));
+static_assert(std::is_same_v<decltype(Params::sharing_id), const char*> &&
+              std::is_same_v<decltype(Params::password), const char*> &&
+              std::is_same_v<decltype(Params::zor_username), const char*> &&
+              std::is_same_v<decltype(Params::zor_password), const char*> &&
+              std::is_same_v<decltype(Params::sharing_sid), const char*>);
+
+// What programs were compiled against.
+static_assert(
+    std::is_same_v<decltype(&TuvoSharingLogin), int (*)(char*, unsigned int, Params*, int)> &&
+    std::is_same_v<decltype(&TuvoSharingIsAuthorized), int (*)(const Params*)> &&
+    std::is_same_v<decltype(&TuvoSharingLogout), int (*)(const char*, const char*)> &&
+    std::is_same_v<decltype(&TuvoSharingIncreaseUseCount), int (*)(const char*)>);
+static_assert(
+    std::is_same_v<decltype(&TUVO::TuvoSharingLogin), int (*)(std::string&, Params*, bool)> &&
+    std::is_same_v<decltype(&TUVO::TuvoSharingIsAuthorized), int (*)(const Params*)> &&
+    std::is_same_v<decltype(&TUVO::TuvoSharingLogout),
+                   bool (*)(const std::string&, const std::string&)> &&
+    std::is_same_v<decltype(&TUVO::TuvoSharingIncreaseUseCount), bool (*)(const std::string&)>);
 
 constexpr char kFill = '#';
 
@@ -44,6 +56,26 @@ class CExports : public VisitTest {
   // The identifier of the newest session.
   std::string NewestId() { return Value("SELECT session_id FROM session ORDER BY id DESC"); }
 };
+
+using Offsets = std::vector<size_t>;
+
+// Five pointers in the order that programs were compiled against, without gaps.
+Offsets ExpectedLayout() {
+  return sizeof(char*) == 4 ? Offsets{0, 4, 8, 12, 16, 20} : Offsets{0, 8, 16, 24, 32, 40};
+}
+
+TEST(LoginParams, HaveTheirLayout) {
+  EXPECT_EQ(ExpectedLayout(),
+            (Offsets{offsetof(Params, sharing_id), offsetof(Params, password),
+                     offsetof(Params, zor_username), offsetof(Params, zor_password),
+                     offsetof(Params, sharing_sid), sizeof(Params)}));
+}
+
+TEST(LoginParams, HaveTheSameLayoutInC) {
+  const c_params_layout layout = get_c_params_layout();
+  EXPECT_EQ(ExpectedLayout(), (Offsets{layout.sharing_id, layout.password, layout.zor_username,
+                                       layout.zor_password, layout.sharing_sid, layout.size}));
+}
 
 TEST_F(CExports, LoginWritesTheIdentifierAndAZero) {
   const Reply reply = LoginInto(33, Visit(MakeLink()));

@@ -16,6 +16,18 @@ struct c_visit {
   int check_after_logout;
 };
 
+/* The login's parameters as C lays them out: where each begins, and the size of all. */
+struct c_params_layout {
+  unsigned int sharing_id;
+  unsigned int password;
+  unsigned int zor_username;
+  unsigned int zor_password;
+  unsigned int sharing_sid;
+  unsigned int size;
+};
+
+struct c_params_layout get_c_params_layout(void);
+
 /* Visits the link `hash` that has the password `password`. */
 struct c_visit make_c_visit(const char* hash, const char* password);
 

@@ -2,11 +2,13 @@
 
 #include <dlfcn.h>
 #include <tuvoplatform/account.h>
+#include <tuvoplatform/auto_block.h>
 #include <tuvoplatform/cgi.h>
 
 #include <algorithm>
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
 #include <new>
 
 namespace tuvo_test {
@@ -71,11 +73,13 @@ using tuvo_test::Spy;
 extern "C" {
 
 int TuvoCgiInit(const char* name, TUVOCGI* cgi) {
-  return Forward(std::string("TuvoCgiInit ") + name, -1, &TuvoCgiInit, "TuvoCgiInit", name, cgi);
+  return Forward(std::string("TuvoCgiInit ") + name, Spy().answer, &TuvoCgiInit, "TuvoCgiInit",
+                 name, cgi);
 }
 
 int TuvoCgiLoadInCookies(TUVOCGI* cgi) {
-  return Forward("TuvoCgiLoadInCookies", -1, &TuvoCgiLoadInCookies, "TuvoCgiLoadInCookies", cgi);
+  return Forward("TuvoCgiLoadInCookies", Spy().answer, &TuvoCgiLoadInCookies,
+                 "TuvoCgiLoadInCookies", cgi);
 }
 
 const char* TuvoCgiGetRequestParam(const TUVOCGI* cgi, const char* name) {
@@ -96,7 +100,8 @@ int TuvoCgiLogin(TUVOCGI* cgi, char* reply, unsigned int size, const LoginInfo* 
                  login->nFlag,
                  size,
                  tuvo_test::IsZero(reply, size)};
-  return Forward("TuvoCgiLogin", -1, &TuvoCgiLogin, "TuvoCgiLogin", cgi, reply, size, login);
+  return Forward("TuvoCgiLogin", Spy().answer, &TuvoCgiLogin, "TuvoCgiLogin", cgi, reply, size,
+                 login);
 }
 
 int TuvoCgiGetRemoteIP(char* ip, unsigned int size) {
@@ -104,7 +109,8 @@ int TuvoCgiGetRemoteIP(char* ip, unsigned int size) {
     Spy().address_size = size;
     Spy().address_was_zero = tuvo_test::IsZero(ip, size);
   }
-  return Forward("TuvoCgiGetRemoteIP", -1, &TuvoCgiGetRemoteIP, "TuvoCgiGetRemoteIP", ip, size);
+  return Forward("TuvoCgiGetRemoteIP", Spy().answer, &TuvoCgiGetRemoteIP, "TuvoCgiGetRemoteIP", ip,
+                 size);
 }
 
 void TuvoCgiFree(TUVOCGI* cgi) {
@@ -112,12 +118,28 @@ void TuvoCgiFree(TUVOCGI* cgi) {
   tuvo_test::Real(&TuvoCgiFree, "TuvoCgiFree")(cgi);
 }
 
+int TuvoCgiIsDeniedIP(const char* ip) {
+  return Forward(std::string("TuvoCgiIsDeniedIP ") + ip, Spy().answer, &TuvoCgiIsDeniedIP,
+                 "TuvoCgiIsDeniedIP", ip);
+}
+
+// Where there is no other name the platform is not asked: on plain Linux it answers 0 for all.
+int TUVOUserLoginNameConvert(const char* name, char* real, unsigned int size) {
+  const auto found = Spy().real_names.find(name);
+  if (found == Spy().real_names.end()) {
+    return 0;
+  }
+  std::strncpy(real, found->second.c_str(), size - 1);
+  return static_cast<int>(found->second.size());
+}
+
 int TUVOUserGet(const char* name, TUVOUSER** user) {
-  return Forward(std::string("TUVOUserGet ") + name, -1, &TUVOUserGet, "TUVOUserGet", name, user);
+  return Forward(std::string("TUVOUserGet ") + name, Spy().answer, &TUVOUserGet, "TUVOUserGet",
+                 name, user);
 }
 
 int TUVOUserGetByUID(unsigned int uid, TUVOUSER** user) {
-  return Forward("TUVOUserGetByUID " + std::to_string(uid), -1, &TUVOUserGetByUID,
+  return Forward("TUVOUserGetByUID " + std::to_string(uid), Spy().answer, &TUVOUserGetByUID,
                  "TUVOUserGetByUID", uid, user);
 }
 
@@ -131,6 +153,22 @@ void TUVOUserFree(TUVOUSER* user) {
 TLIBSZHASH* TLIBGroupInfoHashGet(const char* user, int kind, int flags) {
   return Forward(std::string("TLIBGroupInfoHashGet ") + user, static_cast<TLIBSZHASH*>(nullptr),
                  &TLIBGroupInfoHashGet, "TLIBGroupInfoHashGet", user, kind, flags);
+}
+
+std::time_t time(std::time_t* out) noexcept {
+  std::time_t now = 0;
+  if (Spy().now) {
+    now = *Spy().now;
+    *Spy().now += Spy().step;
+  } else {
+    timespec clock{};
+    clock_gettime(CLOCK_REALTIME, &clock);
+    now = clock.tv_sec;
+  }
+  if (out != nullptr) {
+    *out = now;
+  }
+  return now;
 }
 
 }  // extern "C"

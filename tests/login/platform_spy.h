@@ -6,6 +6,9 @@
 #ifndef TESTS_LOGIN_PLATFORM_SPY_H_
 #define TESTS_LOGIN_PLATFORM_SPY_H_
 
+#include <ctime>
+#include <map>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -28,11 +31,20 @@ struct PlatformSpy {
   unsigned int address_size = 0;  // what TuvoCgiGetRemoteIP was given
   bool address_was_zero = false;
 
-  // The function that fails, once `successes` calls of it went well; -1 (null) is its answer.
+  // The function that fails, once `successes` calls of it went well; its answer is `answer`, or
+  // null.
   std::string failing;
   int successes = 0;
+  int answer = -1;
   // Runs out of memory instead.
   bool throws = false;
+
+  // What TUVOUserLoginNameConvert makes of a name; names that are not here need no conversion.
+  std::map<std::string, std::string> real_names;
+
+  // What the next time() answers, in place of the clock; each call is `step` later than the last.
+  std::optional<std::time_t> now;
+  std::time_t step = 0;
 };
 
 // This process's.

@@ -92,6 +92,22 @@ TEST_F(IsAuthorized, SlidesBothEndsToOneDayAfterTheRequest) {
   EXPECT_EQ(token, Rows("SELECT id, entry_id, session_id FROM token"));
 }
 
+TEST_F(IsAuthorized, TheClockIsReadForTheSessionAndAgainForTheToken) {
+  LogInTo(MakePasswordLink());
+  const Visit visit = Next();
+  const std::time_t begin = std::time(nullptr);
+  Run(visit, [&](std::string&) {
+    Spy().now = begin;
+    Spy().step = 1;
+    const _tag_sharing_login_params params = visit.Params();
+    EXPECT_EQ(1, TUVO::TuvoSharingIsAuthorized(&params));
+    return 0;
+  });
+  const long session = std::stol(Value("SELECT timeout FROM session"));
+  EXPECT_GT(session, begin + kDay);  // the checks before it looked at the clock as well
+  EXPECT_GT(std::stol(Value("SELECT timeout FROM token")), session);
+}
+
 TEST_F(IsAuthorized, RenewsNobodyElse) {
   const std::string hash = MakePasswordLink();
   LogInTo(hash);
@@ -186,7 +202,7 @@ TEST_F(IsAuthorized, RefusesALinkThatIsNotValid) {
   LogInTo(MakePasswordLink());
   const std::pair<const char*, const char*> broken[] = {
       {"enabled = 0", "! enabled_"},
-      {"enabled = 1, start_at = 4000000000", "0 < start_at_ && start_at_ > timeNow"},
+      {"enabled = 1, start_at = 2147483647", "0 < start_at_ && start_at_ > timeNow"},
       {"start_at = 0, expire_at = 1", "0 < expire_at_ && timeNow > expire_at_"},
       {"expire_at = 0, expire_times = 3, use_count = 4",
        "0 < expire_times_ && use_count_ > expire_times_"},
@@ -367,6 +383,15 @@ TEST_F(IsAuthorized, RefusesAnotherAddress) {
   ExpectRefused(-8, log, Next().From(kOtherAddress));
   ExpectRefused(-8, log, Next().From(kOtherAddress).Environment("HTTP_X_FORWARDED_FOR", kAddress));
   EXPECT_EQ(1, Check(Next()).code);
+}
+
+// A session's address was spelled by whoever wrote it; what is spelled otherwise is another.
+TEST_F(IsAuthorized, AddressesAreComparedByteByByte) {
+  LogInTo(MakePasswordLink());
+  for (const char* ip : {"192.0.2.1 ", "192.0.2.10", "192.0.2.", "::ffff:192.0.2.1"}) {
+    Change(std::string("UPDATE session SET ip = '") + ip + "'");
+    ExpectRefused(-8, {std::string("sharinglogin:LINE ip not match, 192.0.2.1, ") + ip}, Next());
+  }
 }
 
 TEST_F(IsAuthorized, OneAddressMayBeSpelledInManyWays) {

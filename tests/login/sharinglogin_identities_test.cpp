@@ -27,7 +27,8 @@ class UnderIds : public VisitTest, public testing::WithParamInterface<Starter> {
 };
 
 class UnderRootsIds : public UnderIds {};
-class UnderNobodysIds : public VisitTest {};
+// Those that neither are nor can become the system identity.
+class UnderNobodysIds : public UnderIds {};
 class UnderSystemsIds : public VisitTest {};
 
 std::string NameOf(const testing::TestParamInfo<Starter>& info) {
@@ -120,53 +121,59 @@ TEST_F(UnderSystemsIds, NoAccountCanLogIn) {
   EXPECT_EQ(1, FailedLogins());
 }
 
-TEST_F(UnderNobodysIds, EverythingIsRefusedAndNothingChanges) {
+TEST_P(UnderNobodysIds, EverythingIsRefusedAndNothingChanges) {
   const std::string hash = MakePasswordLink();
   const std::string id = LoggedIn(Visit(hash).Password("sesame"));
   FailLogins(1);
   const auto files = Files();
   const std::string all = "SELECT * FROM entry, session, token";
   const auto rows = Rows(all);
-  EXPECT_EQ(-4, Login(Visit(hash).Password("sesame").As(kNobody)).code);
-  EXPECT_EQ(-4, Login(Visit(hash).Password("wrong").As(kNobody)).code);
-  EXPECT_EQ(-4, Check(Visit(hash).Session(id).As(kNobody)).code);
-  EXPECT_EQ(0, Logout(hash, id, kNobody).code);
-  EXPECT_EQ(0, CountUse(hash, kNobody).code);
+  EXPECT_EQ(-4, Login(Visit(hash).Password("sesame").As(ids())).code);
+  EXPECT_EQ(-4, Login(Visit(hash).Password("wrong").As(ids())).code);
+  EXPECT_EQ(-4, Check(Visit(hash).Session(id).As(ids())).code);
+  EXPECT_EQ(0, Logout(hash, id, ids()).code);
+  EXPECT_EQ(0, CountUse(hash, ids()).code);
   EXPECT_EQ(rows, Rows(all));
   EXPECT_EQ(files, Files());
   EXPECT_EQ(1, FailedLogins());
 }
 
-TEST_F(UnderNobodysIds, TheReasonIsLogged) {
+TEST_P(UnderNobodysIds, TheReasonIsLogged) {
   MakeLink();
   const Lines cannot_open{
       "base_db:LINE ERROR: IF_RUN_AS(1, 1)", "base_db:LINE (PID) failed to run as system\n\n",
       "base_db:LINE (PID) db is not good.\n\n",
       "sharing_db:LINE (PID) Failed [!pdb_->Execute(\"PRAGMA user_version\", result)], "
       "err=ERRNO\n\n"};
-  EXPECT_EQ(cannot_open, Login(Visit("unknown").As(kNobody)).log);
+  EXPECT_EQ(cannot_open, Login(Visit("unknown").As(ids())).log);
   Lines check = cannot_open;
   check.emplace_back("sharinglogin:LINE db is not good");
   // Each of the three stores tries to shorten the log when it ends.
   check.insert(check.end(), 3, "base_db:LINE (PID) db is not good.\n\n");
-  EXPECT_EQ(check, Check(Visit("unknown").Session("unknown").As(kNobody)).log);
+  EXPECT_EQ(check, Check(Visit("unknown").Session("unknown").As(ids())).log);
 }
 
-TEST_F(UnderNobodysIds, NoFileIsMade) {
-  EXPECT_EQ(-4, Login(Visit("unknown").As(kNobody)).code);
-  EXPECT_EQ(-4, Check(Visit("unknown").Session("unknown").As(kNobody)).code);
+TEST_P(UnderNobodysIds, NoFileIsMade) {
+  EXPECT_EQ(-4, Login(Visit("unknown").As(ids())).code);
+  EXPECT_EQ(-4, Check(Visit("unknown").Session("unknown").As(ids())).code);
   EXPECT_EQ(0U, Files().size());
 }
 
-TEST_F(UnderNobodysIds, AFileOfRootsIsNotMoved) {
+TEST_P(UnderNobodysIds, AFileOfRootsIsNotMoved) {
   MakeLink();
   ASSERT_EQ(0, chown(kDatabase, 0, 0));
-  const Reply reply = Check(Visit("unknown").Session("unknown").As(kNobody));
+  const Reply reply = Check(Visit("unknown").Session("unknown").As(ids()));
   EXPECT_EQ(-5, reply.code);
   EXPECT_EQ(1, std::count(reply.log.begin(), reply.log.end(),
-                          "base_db:LINE Permssion denied. uid=65534"));
+                          "base_db:LINE Permssion denied. uid=" + std::to_string(ids().ruid)));
   EXPECT_EQ(1U, Files().count("sharing.db"));
 }
+
+INSTANTIATE_TEST_SUITE_P(All, UnderNobodysIds,
+                         testing::Values(Starter{"Nobody", kNobody},
+                                         Starter{"SystemUserOfAnotherGroup",
+                                                 {1, 1, 1, 3001, 3001, 3001}}),
+                         NameOf);
 
 }  // namespace
 }  // namespace tuvo_test

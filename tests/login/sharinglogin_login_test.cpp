@@ -5,7 +5,11 @@
 #include <unistd.h>
 
 #include <cstdlib>
+#include <cstring>
+#include <filesystem>
 #include <fstream>
+#include <iterator>
+#include <limits>
 #include <set>
 
 #include "login/platform_spy.h"
@@ -108,6 +112,13 @@ TEST_F(LinkLogin, WithoutAnAddressFails) {
   }
 }
 
+// Its name is for callers, who may read it.
+TEST_F(LinkLogin, TheSharingHeaderIsNotRead) {
+  const std::string hash = MakeLink();
+  EXPECT_EQ(-4, Login(Visit().Environment("HTTP_X_TUVO_SHARING", hash)).code);
+  EXPECT_EQ(-3, Login(Visit("unknown").Environment("HTTP_X_TUVO_SHARING", hash)).code);
+}
+
 TEST_F(LinkLogin, DoesNotBelieveForwardingHeaders) {
   const std::string hash = MakeLink();
   Visit visit(hash);
@@ -157,6 +168,33 @@ TEST_F(LinkLogin, TenWrongPasswordsDenyTheAddress) {
   EXPECT_EQ(1, Login(Visit(hash).Password("sesame").From(kOtherAddress)).code);
 }
 
+TEST_F(LinkLogin, OnlyTheAnswerOneDeniesTheAddress) {
+  const std::string hash = MakeLink();
+  const Visit visit(hash);
+  for (const auto& [answer, code] : {std::pair{1, -8}, {0, 1}, {2, 1}, {-1, 1}}) {
+    const Reply reply = Run(visit, [&, denied = answer](std::string& session_id) {
+      Spy().failing = "TuvoCgiIsDeniedIP";
+      Spy().answer = denied;
+      _tag_sharing_login_params params = visit.Params();
+      return TUVO::TuvoSharingLogin(session_id, &params, false);
+    });
+    EXPECT_EQ(code, reply.code) << answer;
+  }
+}
+
+TEST_F(LinkLogin, AsksForTheAddressItself) {
+  const Visit visit = Visit(MakeLink()).From("2001:DB8:0::1");
+  Run(visit, [&](std::string& session_id) {
+    Spy().calls.clear();
+    _tag_sharing_login_params params = visit.Params();
+    EXPECT_EQ(1, TUVO::TuvoSharingLogin(session_id, &params, false));
+    // Once for the deny list, and once more when the use is counted.
+    EXPECT_EQ((Lines{"TuvoCgiGetRemoteIP", "TuvoCgiIsDeniedIP 2001:db8::1", "TuvoCgiGetRemoteIP"}),
+              Spy().calls);
+    return 0;
+  });
+}
+
 // Nobody is kept out because the service that could tell is broken.
 TEST_F(LinkLogin, GoesOnWhenItCannotBeToldWhetherTheAddressIsDenied) {
   const std::string hash = MakeLink();
@@ -187,7 +225,7 @@ TEST_F(LinkLogin, RefusesALinkThatIsNotValid) {
   const std::string hash = MakeLink();
   const std::pair<const char*, const char*> broken[] = {
       {"enabled = 0", "! enabled_"},
-      {"enabled = 1, start_at = 4000000000", "0 < start_at_ && start_at_ > timeNow"},
+      {"enabled = 1, start_at = 2147483647", "0 < start_at_ && start_at_ > timeNow"},
       {"start_at = 0, expire_at = 1", "0 < expire_at_ && timeNow > expire_at_"},
       {"expire_at = 0, expire_times = -1, project_name = ''", "\"\" == project_name_"},
   };
@@ -485,6 +523,41 @@ TEST_F(LinkLogin, AnExpiredTokenIsRenewedNotDoubled) {
   EXPECT_EQ(1, Check(Visit(hash).Session(id)).code);
 }
 
+// Both lives begin when they are written down, not when the request came.
+TEST_F(LinkLogin, TheClockIsReadForTheSessionAndAgainForTheToken) {
+  const Visit visit(MakeLink());
+  const std::time_t begin = std::time(nullptr);
+  Run(visit, [&](std::string& session_id) {
+    Spy().now = begin;
+    Spy().step = 10;
+    _tag_sharing_login_params params = visit.Params();
+    EXPECT_EQ(1, TUVO::TuvoSharingLogin(session_id, &params, false));
+    return 0;
+  });
+  const long session = std::stol(Value("SELECT timeout FROM session"));
+  const long token = std::stol(Value("SELECT timeout FROM token"));
+  EXPECT_GE(session, begin + kDay);
+  EXPECT_GT(token, session);
+  EXPECT_EQ(0, (session - begin - kDay) % 10);
+  EXPECT_EQ(0, (token - begin - kDay) % 10);
+}
+
+// Times end in 2038 where they have 32 bits; a day that would begin anew at the other end would
+// let nobody in.
+TEST_F(LinkLogin, TheLastDayOfAllEndsWithTheTimes) {
+  const std::string hash = MakeLink();
+  constexpr long kLast = std::numeric_limits<long>::max();
+  const Visit visit(hash);
+  Run(visit, [&](std::string& session_id) {
+    Spy().now = kLast - kDay + 1;
+    _tag_sharing_login_params params = visit.Params();
+    EXPECT_EQ(1, TUVO::TuvoSharingLogin(session_id, &params, true));
+    return 0;
+  });
+  EXPECT_EQ(std::to_string(kLast), Value("SELECT timeout FROM session"));
+  EXPECT_EQ(std::to_string(kLast), Value("SELECT timeout FROM token"));
+}
+
 // What cannot be written.
 
 TEST_F(LinkLogin, GoesOnWhenTheUseCannotBeCounted) {
@@ -594,6 +667,38 @@ TEST_F(LinkLogin, AnExceptionEndsInsideTheLibrary) {
     EXPECT_EQ(-4, reply.code);
     EXPECT_EQ(kUntouched, reply.session_id);
   }
+}
+
+TEST_F(LinkLogin, AVisitStartsNoThread) {
+  const Visit visit(MakeLink());
+  Run(visit, [&](std::string& session_id) {
+    _tag_sharing_login_params params = visit.Params();
+    EXPECT_EQ(1, TUVO::TuvoSharingLogin(session_id, &params, false));
+    params.sharing_sid = session_id.c_str();
+    EXPECT_EQ(1, TUVO::TuvoSharingIsAuthorized(&params));
+    EXPECT_TRUE(TUVO::TuvoSharingLogout(params.sharing_id, session_id));
+    const std::filesystem::directory_iterator threads("/proc/self/task");
+    EXPECT_EQ(1, std::distance(begin(threads), end(threads)));
+    return 0;
+  });
+}
+
+TEST_F(LinkLogin, LeavesTheParametersAsTheyWere) {
+  const Visit visit =
+      Visit(MakePasswordLink()).Password("sesame").Account("alice", "wrong").Session("unknown");
+  const Visit copy = visit;
+  Run(visit, [&](std::string& session_id) {
+    _tag_sharing_login_params params = visit.Params();
+    const _tag_sharing_login_params pointers = params;
+    EXPECT_EQ(1, TUVO::TuvoSharingLogin(session_id, &params, false));
+    EXPECT_EQ(0, std::memcmp(&pointers, &params, sizeof params));
+    EXPECT_STREQ(copy.Params().sharing_id, params.sharing_id);
+    EXPECT_STREQ(copy.Params().password, params.password);
+    EXPECT_STREQ(copy.Params().zor_username, params.zor_username);
+    EXPECT_STREQ(copy.Params().zor_password, params.zor_password);
+    EXPECT_STREQ(copy.Params().sharing_sid, params.sharing_sid);
+    return 0;
+  });
 }
 
 TEST_F(LinkLogin, TextsOfAnyLengthAreTaken) {

@@ -117,6 +117,19 @@ TEST(GetRemoteIP, LooksAtNoHeaderOfTheClient) {
   });
 }
 
+TEST(GetRemoteIP, OnlyTheAnswerMinusOneIsAFailure) {
+  for (const int answer : {0, 1, -2}) {
+    InChild([=] {
+      Visit().EnterEnvironment();
+      Spy().failing = "TuvoCgiGetRemoteIP";
+      Spy().answer = answer;
+      std::string ip = "before";
+      EXPECT_TRUE(GetRemoteIP(ip)) << answer;
+      EXPECT_EQ("", ip);  // what the buffer holds
+    });
+  }
+}
+
 TEST(GetRemoteIP, GivesThePlatformAZeroedBufferOf65Bytes) {
   InChild([] {
     Visit().EnterEnvironment();
@@ -285,6 +298,53 @@ TEST(CheckUserAccess, ACheckByUidMakesTheseCalls) {
                      "TuvoCgiSetCookies id abc /", "TUVOUserGetByUID 2002",
                      "TLIBGroupInfoHashGet bob", "TUVOUserFree", "TuvoCgiFree"}),
               Spy().calls);
+  });
+}
+
+// What CheckUserAccess answers when this function of the platform answers so.
+int AccessWhen(const std::string& function, int answer, const Visit& visit) {
+  Spy().failing = function;
+  Spy().answer = answer;
+  unsigned int uid = kAlice;
+  return Access(LinkFor({kAlice}), visit, uid);
+}
+
+TEST(CheckUserAccess, EveryAnswerOfThePlatformButOneIsAFailure) {
+  for (const int answer : {-1, 0, 2}) {
+    InChild([=] {
+      EXPECT_EQ(-4, AccessWhen("TuvoCgiInit", answer, Alice())) << answer;
+      EXPECT_EQ(-4, AccessWhen("TuvoCgiSetCookies", answer, Alice().Query("_sid=abc"))) << answer;
+      EXPECT_EQ(-2, AccessWhen("TuvoCgiLogin", answer, Alice())) << answer;
+    });
+  }
+}
+
+TEST(CheckUserAccess, EveryAnswerToALookUpByUidButZeroIsAFailure) {
+  for (const int answer : {-1, 1}) {
+    InChild([=] { EXPECT_EQ(-4, AccessWhen("TUVOUserGetByUID", answer, Visit())) << answer; });
+  }
+}
+
+// Only -1 means that there is no such account; another failure leaves no record either.
+TEST(CheckUserAccess, ALookUpWithoutARecordFails) {
+  InChild([] {
+    EXPECT_EQ(-4, AccessWhen("TUVOUserGet", -2, Alice()));
+    EXPECT_EQ(0, CountOf("TUVOUserFree"));
+    EXPECT_EQ(1, CountOf("TuvoCgiFree"));
+  });
+}
+
+TEST(CheckUserAccess, GoesOnWithoutTheRequestsCookies) {
+  InChild([] { EXPECT_EQ(1, AccessWhen("TuvoCgiLoadInCookies", -1, Alice())); });
+}
+
+// The look-up converts the name itself: what it is given is what the visitor typed.
+TEST(CheckUserAccess, TheNameIsConvertedOnceForTheLoginAndOnceForTheLookUp) {
+  InChild([] {
+    Spy().real_names = {{"Alice (typed)", "alice"}, {"alice", "bob"}};
+    EXPECT_EQ(1, Access(LinkFor({kAlice}), Visit().Account("Alice (typed)", "alice-secret")));
+    EXPECT_EQ("alice", Spy().login.user);
+    EXPECT_EQ(1, CountOf("TUVOUserGet alice"));
   });
 }
 

@@ -104,8 +104,9 @@ class VisitTest : public testing::Test {
   std::string LoggedIn(const Visit& visit);
 
   // The lines since the last call, those that PAM writes about accounts left out. Source lines,
-  // process ids and the texts of errno are replaced by LINE, PID and ERRNO. Expects that lines
-  // other than those about the identity switch are at LOG_USER and LOG_ERR.
+  // process ids and the texts of errno are replaced by LINE, PID and ERRNO; the number in a line of
+  // the login API only if it is that of the check that failed. Expects that lines other than those
+  // about the identity switch are at LOG_USER and LOG_ERR.
   Lines TakeLog();
 
   // A look at the database, and changes behind the library's back.

@@ -7,9 +7,12 @@
 #include <cerrno>
 #include <cstdlib>
 #include <fstream>
+#include <functional>
 #include <memory>
 #include <string>
 #include <vector>
+
+#include "platform/failing_allocations.h"
 
 namespace {
 
@@ -133,6 +136,15 @@ TEST(Account, UserRecordBeginsWithNameAndUid) {
   EXPECT_EQ(2003U, beginning->uid);
 }
 
+TEST(Account, UidAndPrimaryGroupAreToldApart) {
+  Append("/etc/passwd", "apart:x:2061:3061::/:/bin/false\n");
+  for (const User& user : {UserByName("apart"), UserByUid(2061)}) {
+    ASSERT_NE(nullptr, user);
+    EXPECT_EQ(2061U, user->nUid);
+    EXPECT_EQ(3061U, user->nGid);
+  }
+}
+
 TEST(Account, UnknownUsersAreNotFound) {
   for (const char* name : {"nobody-here", "", "2001", "alice:x", "Alice", " alice", "alice\n"}) {
     EXPECT_EQ(nullptr, UserByName(name)) << name;
@@ -189,6 +201,13 @@ TEST(Account, GroupsOfAUserAreHisPrimaryAndAllOthers) {
   std::sort(names.begin(), names.end());
   EXPECT_EQ((Names{"alice", "friends"}), names);
   EXPECT_EQ(Names{"bob"}, GroupNames("bob"));
+}
+
+TEST(Account, PrimaryGroupComesFirst) {
+  EXPECT_EQ((Names{"alice", "friends"}), GroupNames("alice"));
+  Append("/etc/passwd", "late:x:2051:3051::/:/bin/false\n");
+  Append("/etc/group", "early:x:2052:late\nlate:x:3051:\n");
+  EXPECT_EQ((Names{"late", "early"}), GroupNames("late"));
 }
 
 TEST(Account, GroupsOfAnUnknownUserAreNull) {
@@ -272,6 +291,48 @@ TEST(Account, UserInHundredsOfGroupsHasThemAll) {
   std::sort(names.begin(), names.end());
   std::sort(expected.begin(), expected.end());
   EXPECT_EQ(expected, names);
+}
+
+// How often `look_up`, which answers 0 on success, fails when single allocations do.
+int FailuresWithoutMemory(const std::function<int()>& look_up) {
+  for (int failing = 0;; ++failing) {
+    tuvo_test::allocations_left = failing;
+    const int code = look_up();
+    tuvo_test::allocations_left = -1;
+    if (code == 0) {
+      return failing;
+    }
+    EXPECT_EQ(-1, code);
+  }
+}
+
+TEST(Account, EveryLackOfMemoryIsAFailureAndNoException) {
+  const auto user = [](const auto& get) {
+    TUVOUSER* found = nullptr;
+    const int code = get(&found);
+    EXPECT_EQ(code == 0, found != nullptr);
+    TUVOUserFree(found);
+    return code;
+  };
+  EXPECT_LT(1, FailuresWithoutMemory([&] {
+              return user([](TUVOUSER** found) { return TUVOUserGet("alice", found); });
+            }));
+  EXPECT_LT(1, FailuresWithoutMemory([&] {
+              return user([](TUVOUSER** found) { return TUVOUserGetByUID(2001, found); });
+            }));
+  unsigned int gid = 0;
+  EXPECT_LT(0, FailuresWithoutMemory([&] { return TUVOGroupGetGID("friends", &gid); }));
+  EXPECT_LT(1, FailuresWithoutMemory([] {
+              TUVOGROUP* found = nullptr;
+              const int code = TUVOGroupGetByGID(3001, &found);
+              EXPECT_EQ(code == 0, found != nullptr);
+              TUVOGroupFree(found);
+              return code;
+            }));
+  EXPECT_LT(5, FailuresWithoutMemory([] {
+              const Hash names(TLIBGroupInfoHashGet("alice", 1, 0));
+              return names != nullptr ? 0 : -1;
+            }));
 }
 
 TEST(Account, InterruptedLookupIsTriedAgain) {

@@ -11,6 +11,24 @@
 #include <stdexcept>
 #include <string>
 
+namespace {
+
+time_t clock_time = 0;  // what time() answers in place of the clock; 0: the real time
+
+}  // namespace
+
+// Stands in front of the C library's for this program.
+extern "C" __attribute__((visibility("default"))) time_t time(time_t* out) noexcept {
+  timespec now{clock_time, 0};
+  if (clock_time == 0) {
+    clock_gettime(CLOCK_REALTIME, &now);
+  }
+  if (out != nullptr) {
+    *out = now.tv_sec;
+  }
+  return now.tv_sec;
+}
+
 namespace tuvo_platform {
 namespace {
 
@@ -39,7 +57,10 @@ std::string Sql(const std::string& sql) {
 class AutoBlockStoreTest : public testing::Test {
  protected:
   void SetUp() override { unlink(kPath); }
-  void TearDown() override { unlink(kPath); }
+  void TearDown() override {
+    unlink(kPath);
+    clock_time = 0;
+  }
 
   static void Count(const std::string& network, int times, const AutoBlockLimits& limits,
                     const std::string& service = "WEB") {
@@ -95,6 +116,41 @@ TEST_F(AutoBlockStoreTest, FailuresWithinTheWindowCount) {
   Count(kVisitor, 9, limits_);
   Sql("UPDATE failure SET at = at - 290");
   Count(kVisitor, 1, limits_);
+  EXPECT_TRUE(IsDenied(kVisitor));
+}
+
+TEST_F(AutoBlockStoreTest, AFailureAsOldAsTheWindowStillCounts) {
+  clock_time = 1000000;
+  Count(kVisitor, 9, limits_);
+  clock_time += static_cast<time_t>(limits_.window_seconds);
+  Count(kVisitor, 1, limits_);
+  EXPECT_TRUE(IsDenied(kVisitor));
+}
+
+TEST_F(AutoBlockStoreTest, AFailureASecondOlderThanTheWindowIsForgotten) {
+  clock_time = 1000000;
+  Count(kVisitor, 9, limits_);
+  clock_time += static_cast<time_t>(limits_.window_seconds) + 1;
+  Count(kVisitor, 1, limits_);
+  EXPECT_FALSE(IsDenied(kVisitor));
+  EXPECT_EQ(Sql("SELECT COUNT(*) FROM failure"), "1");
+}
+
+TEST_F(AutoBlockStoreTest, ADenialLastsItsSecondsToTheLast) {
+  clock_time = 1000000;
+  Count(kVisitor, 10, limits_);
+  clock_time += static_cast<time_t>(limits_.block_seconds) - 1;
+  EXPECT_TRUE(IsDenied(kVisitor));
+  clock_time += 1;
+  EXPECT_FALSE(IsDenied(kVisitor));
+}
+
+// The moment at which it ends is the first at which failures count again.
+TEST_F(AutoBlockStoreTest, FailuresCountAgainAsSoonAsTheDenialEnds) {
+  clock_time = 1000000;
+  Count(kVisitor, 10, limits_);
+  clock_time += static_cast<time_t>(limits_.block_seconds);
+  Count(kVisitor, 10, limits_);
   EXPECT_TRUE(IsDenied(kVisitor));
 }
 

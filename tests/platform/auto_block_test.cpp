@@ -8,11 +8,15 @@
 #include <unistd.h>
 
 #include <cstdlib>
+#include <ctime>
+#include <filesystem>
 #include <fstream>
+#include <iterator>
 #include <string>
 #include <vector>
 
 #include "support/child.h"
+#include "support/source_line.h"
 #include "support/syslog_listener.h"
 
 namespace {
@@ -41,6 +45,17 @@ std::string Sql(const std::string& sql) {
   return first;
 }
 
+constexpr char kCounting[] = "int AutoBlockFailLoginSet(";
+constexpr char kClearing[] = "int TUVOAutoBlockFailLoginReset(";
+constexpr char kAsking[] = "int TuvoCgiIsDeniedIP(";
+
+// The line that one of the functions above logs: it names the place where the function begins its
+// work.
+std::string LineOf(const char* function, const std::string& reason) {
+  const int line = tuvo_test::SourceLine("platform/src/auto_block.cpp", "__LINE__", function);
+  return "auto_block:" + std::to_string(line) + " " + reason;
+}
+
 void Fail(const char* ip, int times, const char* service = "SHARING") {
   for (int i = 0; i < times; ++i) {
     EXPECT_EQ(AutoBlockFailLoginSet(ip, service), 0);
@@ -55,14 +70,21 @@ class AutoBlock : public testing::Test {
     unlink(kConfig);
   }
 
-  // The only line logged since the last call, without its number.
-  std::string OnlyLine() {
-    const auto lines = log_.Take();
-    if (lines.size() != 1) {
-      return std::to_string(lines.size()) + " lines";
+  // The lines logged since the last call.
+  std::vector<std::string> Lines() {
+    std::vector<std::string> texts;
+    for (const tuvo_test::LogLine& line : log_.Take()) {
+      EXPECT_EQ(line.facility, LOG_USER);
+      EXPECT_EQ(line.priority, LOG_ERR);
+      texts.push_back(line.text);
     }
-    EXPECT_EQ(lines[0].priority, LOG_ERR);
-    return tuvo_test::Normalized(lines[0].text);
+    return texts;
+  }
+
+  // The only one of them; "2 lines" when there are two.
+  std::string OnlyLine() {
+    const std::vector<std::string> lines = Lines();
+    return lines.size() == 1 ? lines[0] : std::to_string(lines.size()) + " lines";
   }
 
   tuvo_test::SyslogListener log_;
@@ -158,21 +180,42 @@ TEST_F(AutoBlock, BadConfigurationMeansDefaults) {
   EXPECT_TRUE(log_.Take().empty());
 }
 
+// The system's own user reads it, whoever asks.
+TEST_F(AutoBlock, ConfigurationThatTheSystemCannotReadCountsAsMissing) {
+  std::ofstream(kConfig) << "failures = 1\n";
+  ASSERT_EQ(chmod(kConfig, 0600), 0);
+  Fail(kIp, 1);
+  EXPECT_EQ(TuvoCgiIsDeniedIP(kIp), 0);
+  ASSERT_EQ(chmod(kConfig, 0644), 0);
+  Fail(kIp, 1);
+  EXPECT_EQ(TuvoCgiIsDeniedIP(kIp), 1);
+}
+
+TEST_F(AutoBlock, ShorterLimitsShortenARunningDenialAtTheNextFailure) {
+  Fail(kIp, 10);
+  std::ofstream(kConfig) << "block_seconds = 5\n";
+  const std::string left = "SELECT until - strftime('%s', 'now') <= 5 FROM denial";
+  EXPECT_EQ(Sql(left), "0");
+  Fail("192.0.2.2", 1);
+  EXPECT_EQ(Sql(left), "1");
+  EXPECT_EQ(TuvoCgiIsDeniedIP(kIp), 1);
+}
+
 TEST_F(AutoBlock, TextsThatAreNoAddressesFailWithALine) {
   for (const char* ip : {static_cast<const char*>(nullptr), "", "host", "192.0.2.1 "}) {
     EXPECT_EQ(AutoBlockFailLoginSet(ip, "SHARING"), -1);
-    EXPECT_EQ(OnlyLine(), "auto_block:LINE not an address");
+    EXPECT_EQ(OnlyLine(), LineOf(kCounting, "not an address"));
     EXPECT_EQ(TUVOAutoBlockFailLoginReset(ip), -1);
-    EXPECT_EQ(OnlyLine(), "auto_block:LINE not an address");
+    EXPECT_EQ(OnlyLine(), LineOf(kClearing, "not an address"));
     EXPECT_EQ(TuvoCgiIsDeniedIP(ip), -1);
-    EXPECT_EQ(OnlyLine(), "auto_block:LINE not an address");
+    EXPECT_EQ(OnlyLine(), LineOf(kAsking, "not an address"));
   }
 }
 
 TEST_F(AutoBlock, ServiceNeedsAName) {
   for (const char* service : {static_cast<const char*>(nullptr), ""}) {
     EXPECT_EQ(AutoBlockFailLoginSet(kIp, service), -1);
-    EXPECT_EQ(OnlyLine(), "auto_block:LINE not a service's name");
+    EXPECT_EQ(OnlyLine(), LineOf(kCounting, "not a service's name"));
   }
   EXPECT_EQ(AutoBlockFailLoginSet(kIp, std::string(64, 'x').c_str()), 0);
   EXPECT_EQ(AutoBlockFailLoginSet(kIp, std::string(65, 'x').c_str()), -1);
@@ -182,11 +225,11 @@ TEST_F(AutoBlock, CorruptFileFailsWithALine) {
   std::ofstream(kStore) << std::string(8192, 'x');
   ASSERT_EQ(chown(kStore, 1, 1), 0);
   EXPECT_EQ(TuvoCgiIsDeniedIP(kIp), -1);
-  EXPECT_EQ(OnlyLine(), "auto_block:LINE file is not a database");
+  EXPECT_EQ(OnlyLine(), LineOf(kAsking, "file is not a database"));
   EXPECT_EQ(AutoBlockFailLoginSet(kIp, "SHARING"), -1);
-  EXPECT_EQ(OnlyLine(), "auto_block:LINE file is not a database");
+  EXPECT_EQ(OnlyLine(), LineOf(kCounting, "file is not a database"));
   EXPECT_EQ(TUVOAutoBlockFailLoginReset(kIp), -1);
-  EXPECT_EQ(OnlyLine(), "auto_block:LINE file is not a database");
+  EXPECT_EQ(OnlyLine(), LineOf(kClearing, "file is not a database"));
 }
 
 // One failure in a process that starts as `ids`; its ids must be the same afterwards.
@@ -220,11 +263,14 @@ TEST_F(AutoBlock, AllIdentitiesShareOneCount) {
 }
 
 TEST_F(AutoBlock, NobodyFailsWithALine) {
+  using Texts = std::vector<std::string>;
+  const std::string no_new_file = std::string(kStore) + ": Permission denied";
   EXPECT_EQ(FailAs(tuvo_test::kNobody), 7);
-  EXPECT_EQ(log_.Take().size(), 2u);
+  EXPECT_EQ(Lines(), (Texts{LineOf(kCounting, no_new_file), LineOf(kAsking, no_new_file)}));
   Fail(kIp, 1);
+  const std::string no_access = "unable to open database file";
   EXPECT_EQ(FailAs(tuvo_test::kNobody), 7);
-  EXPECT_EQ(log_.Take().size(), 2u);
+  EXPECT_EQ(Lines(), (Texts{LineOf(kCounting, no_access), LineOf(kAsking, no_access)}));
 }
 
 TEST_F(AutoBlock, ProcessesCountingAtOnceLoseNoCount) {
@@ -257,28 +303,67 @@ TEST_F(AutoBlock, ProcessesCountingAtOnceLoseNoCount) {
   EXPECT_TRUE(log_.Take().empty());
 }
 
+// Another process that holds a lock of the store for two seconds.
+class Holder {
+ public:
+  // Returns once the lock is taken; `begin` is the statement that takes it.
+  explicit Holder(const char* begin) {
+    int ready[2];
+    EXPECT_EQ(pipe(ready), 0);
+    child_ = fork();
+    if (child_ == 0) {
+      sqlite3* database = nullptr;
+      sqlite3_open(kStore, &database);
+      sqlite3_exec(database, begin, nullptr, nullptr, nullptr);
+      (void)!write(ready[1], "x", 1);
+      sleep(2);
+      sqlite3_exec(database, "COMMIT", nullptr, nullptr, nullptr);
+      _exit(0);
+    }
+    char byte = 0;
+    EXPECT_EQ(read(ready[0], &byte, 1), 1);
+    close(ready[0]);
+    close(ready[1]);
+  }
+  ~Holder() { waitpid(child_, nullptr, 0); }
+  Holder(const Holder&) = delete;
+  Holder& operator=(const Holder&) = delete;
+
+ private:
+  pid_t child_ = -1;
+};
+
 TEST_F(AutoBlock, LongLockOfAnotherProcessIsWaitedFor) {
   Fail(kIp, 1);
-  int ready[2];
-  ASSERT_EQ(pipe(ready), 0);
-  const pid_t child = fork();
-  if (child == 0) {
-    sqlite3* database = nullptr;
-    sqlite3_open(kStore, &database);
-    sqlite3_exec(database, "BEGIN EXCLUSIVE", nullptr, nullptr, nullptr);
-    (void)!write(ready[1], "x", 1);
-    sleep(2);
-    sqlite3_exec(database, "COMMIT", nullptr, nullptr, nullptr);
-    _exit(0);
+  {
+    const Holder holder("BEGIN EXCLUSIVE");
+    Fail(kIp, 1);
+    EXPECT_EQ(TuvoCgiIsDeniedIP(kIp), 0);
   }
-  char byte = 0;
-  ASSERT_EQ(read(ready[0], &byte, 1), 1);
-  EXPECT_EQ(AutoBlockFailLoginSet(kIp, "SHARING"), 0);
-  EXPECT_EQ(TuvoCgiIsDeniedIP(kIp), 0);
-  waitpid(child, nullptr, 0);
-  close(ready[0]);
-  close(ready[1]);
   EXPECT_EQ(Sql("SELECT COUNT(*) FROM failure"), "2");
+}
+
+// Else a process that waits would count its failure as one of the past, or of before a reset.
+TEST_F(AutoBlock, AFailureIsOneOfTheMomentAtWhichItIsWritten) {
+  Fail("192.0.2.2", 1);
+  const std::string begin = std::to_string(time(nullptr));
+  {
+    const Holder holder("BEGIN IMMEDIATE");  // lets others read meanwhile
+    Fail(kIp, 1);
+  }
+  EXPECT_EQ(Sql("SELECT MAX(at) > " + begin + " FROM failure"), "1");
+}
+
+TEST_F(AutoBlock, NoDescriptorStaysOpen) {
+  const auto open_descriptors = [] {
+    const std::filesystem::directory_iterator folder("/proc/self/fd");
+    return std::distance(begin(folder), end(folder));
+  };
+  const auto before = open_descriptors();
+  Fail(kIp, 2);
+  EXPECT_EQ(TuvoCgiIsDeniedIP(kIp), 0);
+  EXPECT_EQ(TUVOAutoBlockFailLoginReset(kIp), 0);
+  EXPECT_EQ(open_descriptors(), before);
 }
 
 }  // namespace

@@ -1,15 +1,21 @@
 #include <gtest/gtest.h>
+#include <security/pam_appl.h>
 #include <sys/stat.h>
+#include <sys/syslog.h>
 #include <tuvoplatform/cgi.h>
 #include <unistd.h>
 
+#include <cstddef>
 #include <cstdlib>
 #include <cstring>
 #include <fstream>
 #include <functional>
 #include <string>
+#include <type_traits>
+#include <vector>
 
 #include "support/child.h"
+#include "support/source_line.h"
 #include "support/syslog_listener.h"
 
 namespace {
@@ -46,6 +52,12 @@ class Service {
   const std::string path_;
 };
 
+// The one line about a login that could not be checked.
+std::vector<std::string> TroubleWith(const std::string& service, const std::string& reason) {
+  const int line = tuvo_test::SourceLine("platform/src/cgi_login.cpp", "syslog(LOG_ERR");
+  return {"cgi_login:" + std::to_string(line) + " PAM service " + service + ": " + reason};
+}
+
 class CgiLogin : public testing::Test {
  protected:
   void SetUp() override {
@@ -54,12 +66,15 @@ class CgiLogin : public testing::Test {
     unsetenv("REMOTE_ADDR");
   }
 
-  // The last line that this project's own code logged since the last call, without its number.
-  std::string OwnLine() {
-    std::string own = "(none)";
-    for (const std::string& line : log_.TakeTexts()) {
-      if (line.rfind("cgi_login:", 0) == 0) {
-        own = tuvo_test::Normalized(line);
+  // The lines that this project's own code logged since the last call, PAM's and its modules' left
+  // out.
+  std::vector<std::string> OwnLines() {
+    std::vector<std::string> own;
+    for (const tuvo_test::LogLine& line : log_.Take()) {
+      if (line.text.rfind("cgi_login:", 0) == 0) {
+        EXPECT_EQ(line.facility, LOG_USER);
+        EXPECT_EQ(line.priority, LOG_ERR);
+        own.push_back(line.text);
       }
     }
     return own;
@@ -67,6 +82,18 @@ class CgiLogin : public testing::Test {
 
   tuvo_test::SyslogListener log_;
 };
+
+// Callers are compiled against this order; the numbers have 32 bits everywhere.
+TEST_F(CgiLogin, InfoHasItsLayout) {
+  static_assert(std::is_standard_layout_v<LoginInfo>);
+  static_assert(sizeof(LoginInfo::nType) == 4 && sizeof(LoginInfo::nFlag) == 4);
+  const std::vector<size_t> layout = {
+      offsetof(LoginInfo, szUser), offsetof(LoginInfo, szPassword), offsetof(LoginInfo, szClient),
+      offsetof(LoginInfo, nType),  offsetof(LoginInfo, nFlag),      sizeof(LoginInfo)};
+  const std::vector<size_t> with_32_bits = {0, 4, 8, 12, 16, 20};
+  const std::vector<size_t> with_64_bits = {0, 8, 16, 24, 28, 32};
+  EXPECT_EQ(layout, sizeof(char*) == 4 ? with_32_bits : with_64_bits);
+}
 
 TEST_F(CgiLogin, RightPasswordIsAllowed) {
   std::string reply;
@@ -234,6 +261,9 @@ TEST_F(CgiLogin, PamLearnsTheClientsAddress) {
   EXPECT_EQ(lines[0].find("wrong"), std::string::npos) << lines[0];
 }
 
+// Where the module leaves a trace when it is asked for more than a check.
+constexpr char kPamTrace[] = "/tmp/pam-prompt-module";
+
 // A service whose authentication is the module of pam_prompt_module.cpp with these arguments.
 std::string PromptService(const std::string& arguments) {
   return "auth required " TUVO_PAM_PROMPT_MODULE " " + arguments +
@@ -256,8 +286,7 @@ TEST_F(CgiLogin, OtherPromptsAreRefused) {
   for (const char* arguments : {"radio", "binary", "off=p@ss radio", "none"}) {
     const Service service("webui-prompt", PromptService(arguments));
     EXPECT_NE(Login("alice", "p@ss", "webui-prompt"), 1) << arguments;
-    EXPECT_EQ(OwnLine(), "cgi_login:LINE PAM service webui-prompt: Conversation error")
-        << arguments;
+    EXPECT_EQ(OwnLines(), TroubleWith("webui-prompt", "Conversation error")) << arguments;
   }
 }
 
@@ -270,7 +299,10 @@ TEST_F(CgiLogin, ReplyIsTheNameThatPamEndsWith) {
 
 TEST_F(CgiLogin, PamRunsAsRootWhenRootIsKept) {
   const Service service("webui-prompt", PromptService("ids=0:0"));
-  for (const tuvo_test::Ids& ids : {tuvo_test::kRoot, tuvo_test::kSavedRoot}) {
+  const tuvo_test::Ids real_root{0, 65534, 65534, 0, 65534, 65534};
+  const tuvo_test::Ids root_alone{65534, 0, 65534, 65534, 65534, 65534};
+  for (const tuvo_test::Ids& ids :
+       {tuvo_test::kRoot, tuvo_test::kSavedRoot, real_root, root_alone}) {
     EXPECT_EQ(RunInChildAs(ids, [] { return Login("alice", "x", "webui-prompt") == 1 ? 0 : 1; }),
               0);
   }
@@ -279,17 +311,34 @@ TEST_F(CgiLogin, PamRunsAsRootWhenRootIsKept) {
             7);
 }
 
+TEST_F(CgiLogin, ModulesAreToldToBeSilentAndToRefuseEmptyPasswords) {
+  const std::string flags = std::to_string(PAM_SILENT | PAM_DISALLOW_NULL_AUTHTOK);
+  const Service service("webui-prompt", PromptService("flags=" + flags));
+  EXPECT_EQ(Login("alice", "x", "webui-prompt"), 1);
+  const Service other("webui-other", PromptService("flags=0"));
+  EXPECT_NE(Login("alice", "x", "webui-other"), 1);
+}
+
+// The account is checked and not used: nothing is to be closed again afterwards.
+TEST_F(CgiLogin, NeitherSessionNorCredentialsAreAskedFor) {
+  const Service service(
+      "webui-prompt", PromptService("off=p@ss") + "session required " TUVO_PAM_PROMPT_MODULE "\n");
+  unlink(kPamTrace);
+  EXPECT_EQ(Login("alice", "p@ss", "webui-prompt"), 1);
+  EXPECT_NE(access(kPamTrace, F_OK), 0);
+}
+
 TEST_F(CgiLogin, BrokenServiceIsLogged) {
   const Service service("webui-broken", "auth required pam_no_such_module.so\n");
   EXPECT_NE(Login("alice", "alice-secret", "webui-broken"), 1);
-  EXPECT_EQ(OwnLine(), "cgi_login:LINE PAM service webui-broken: Module is unknown");
+  EXPECT_EQ(OwnLines(), TroubleWith("webui-broken", "Module is unknown"));
 }
 
 TEST_F(CgiLogin, RefusalsAreLeftToTheModulesToLog) {
   EXPECT_NE(Login("alice", "wrong"), 1);
   EXPECT_NE(Login("mallory", "wrong"), 1);
   EXPECT_NE(Login("dave", "dave-secret"), 1);
-  EXPECT_EQ(OwnLine(), "(none)");
+  EXPECT_EQ(OwnLines(), std::vector<std::string>{});
 }
 
 }  // namespace

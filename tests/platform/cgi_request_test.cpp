@@ -185,6 +185,11 @@ TEST(CgiRequest, OtherMethodsHaveNoBodyRead) {
   }
 }
 
+TEST(CgiRequest, OtherMethodsLengthsAreNotLookedAt) {
+  EXPECT_EQ(Get("b=2").Set("CONTENT_LENGTH", "no number").Param("b"), "2");
+  EXPECT_EQ(Get("b=2").Set("CONTENT_LENGTH", "10485760").Param("b"), "2");
+}
+
 TEST(CgiRequest, BodiesOfOtherTypesAreLeftUnread) {
   for (const char* type : {"application/json", "text/plain", "application/x-www-form-urlencodedx",
                            "multipart/form-datax; boundary=XyZ", "multipart/mixed; boundary=XyZ"}) {

@@ -12,25 +12,31 @@
 #include <map>
 #include <string>
 
+#include "platform/failing_allocations.h"
 #include "support/child.h"
 
 namespace {
 
 using Environment = std::map<std::string, std::string>;
 
-// Runs `check` in a process that serves the request of `environment` and `body`, since a process
-// reads its request only once.
+// Makes this process one that serves the request of `environment` and `body`.
+void Enter(const Environment& environment, const std::string& body) {
+  clearenv();
+  for (const auto& [name, value] : environment) {
+    setenv(name.c_str(), value.c_str(), 1);
+  }
+  std::FILE* input = std::tmpfile();
+  std::fwrite(body.data(), 1, body.size(), input);
+  std::rewind(input);
+  dup2(fileno(input), STDIN_FILENO);
+}
+
+// Runs `check` in a process of its own that serves the request, since a process reads its request
+// only once.
 int Serve(const Environment& environment, const std::string& body,
           const std::function<void()>& check) {
   return tuvo_test::RunInChild([&] {
-    clearenv();
-    for (const auto& [name, value] : environment) {
-      setenv(name.c_str(), value.c_str(), 1);
-    }
-    std::FILE* input = std::tmpfile();
-    std::fwrite(body.data(), 1, body.size(), input);
-    std::rewind(input);
-    dup2(fileno(input), STDIN_FILENO);
+    Enter(environment, body);
     check();
     return 0;
   });
@@ -235,6 +241,37 @@ TEST(Cgi, TextsOfTenMebibytesAreRefusedInBoundedMemory) {
                     }),
               0);
   }
+}
+
+// What a program does with its request, while allocation number `failing` fails: whether all of it
+// went well.
+bool UseRequest(long failing) {
+  TUVOCGI cgi{};
+  std::array<char, 65> ip{};
+  tuvo_test::allocations_left = failing;
+  const bool begun = TuvoCgiInit("", &cgi) == 1;
+  const bool has_address = TuvoCgiGetRemoteIP(ip.data(), ip.size()) == 0;
+  const bool queued =
+      TuvoCgiSetCookies(&cgi, "id", "a-value-longer-than-a-string-object-holds", "/") == 1;
+  tuvo_test::allocations_left = -1;
+  return begun && has_address && queued;
+}
+
+TEST(Cgi, EveryLackOfMemoryIsAFailureAndNoException) {
+  Environment environment = Post("application/x-www-form-urlencoded", 60);
+  environment["QUERY_STRING"] = "b=" + std::string(50, 'y');
+  environment["HTTP_COOKIE"] = "c=" + std::string(50, 'z');
+  environment["REMOTE_ADDR"] = "2001:db8:1111:2222:3333:4444:5555:6666";
+  constexpr int kFailed = 1;
+  long failing = 0;
+  for (int code = kFailed; code == kFailed; ++failing) {
+    code = tuvo_test::RunInChild([&] {
+      Enter(environment, "a=" + std::string(58, 'x'));
+      return UseRequest(failing) ? 0 : kFailed;
+    });
+    ASSERT_TRUE(code == 0 || code == kFailed) << code << " at allocation " << failing;
+  }
+  EXPECT_GT(failing, 20);
 }
 
 // What TuvoCgiGetRemoteIP writes with these variables set; "(none)" for a failure.

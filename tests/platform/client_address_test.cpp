@@ -68,6 +68,7 @@ TEST(ClientAddress, VisitorOfIpv4IsTheAddress) {
 TEST(ClientAddress, VisitorOfIpv6IsItsNetwork) {
   EXPECT_EQ(Network("2001:db8:1:2:3:4:5:6"), "2001:db8:1:2::/64");
   EXPECT_EQ(Network("2001:db8:1:2::"), "2001:db8:1:2::/64");
+  EXPECT_EQ(Network("2001:db8:1:2:ffff:ffff:ffff:ffff"), "2001:db8:1:2::/64");
   EXPECT_EQ(Network("2001:db8:1:3::"), "2001:db8:1:3::/64");
   EXPECT_EQ(Network("::1"), "::/64");
   EXPECT_EQ(Network("fe80::1%eth0"), "fe80::/64");

@@ -22,51 +22,15 @@
 #include <vector>
 
 #include "platform/database_handles.h"
+#include "platform/failing_allocations.h"
 #include "platform/temp_folder.h"
 #include "support/child.h"
-
-// Allocations of this program and of the library that it tests: the one that `allocations_left`
-// counts down to fails. Negative: none does.
-namespace {
-
-long allocations_left = -1;
-
-void* Allocate(std::size_t size) {
-  if (allocations_left >= 0 && allocations_left-- == 0) {
-    return nullptr;
-  }
-  return std::malloc(size == 0 ? 1 : size);
-}
-
-}  // namespace
-
-// Not inlined: the compiler would see `free` meet a call of `operator new` and object.
-#define NOT_INLINED __attribute__((noinline))
-
-NOT_INLINED void* operator new(std::size_t size) {
-  void* memory = Allocate(size);
-  if (memory == nullptr) {
-    throw std::bad_alloc();
-  }
-  return memory;
-}
-NOT_INLINED void* operator new(std::size_t size, const std::nothrow_t& /*nothrow*/) noexcept {
-  return Allocate(size);
-}
-NOT_INLINED void operator delete(void* memory) noexcept {
-  std::free(memory);
-}
-NOT_INLINED void operator delete(void* memory, std::size_t /*size*/) noexcept {
-  std::free(memory);
-}
-NOT_INLINED void operator delete(void* memory, const std::nothrow_t& /*nothrow*/) noexcept {
-  std::free(memory);
-}
 
 namespace {
 
 using std::chrono::milliseconds;
 using std::chrono::seconds;
+using tuvo_test::allocations_left;
 using tuvo_test::Connect;
 using tuvo_test::Db;
 using tuvo_test::Error;
@@ -213,6 +177,28 @@ TEST_F(Database, ConnectingAnswersNullWithoutThePermission) {
               EXPECT_EQ(nullptr, Connect(folder_ / "new.db"));
               return 0;
             }));
+}
+
+TEST_F(Database, FileThatTheCallerMayOnlyReadOpensAndItsFirstWriteFails) {
+  ASSERT_EQ(0, chmod(folder_.path().c_str(), 0755));
+  ASSERT_EQ(0, chmod(path_.c_str(), 0644));
+  EXPECT_EQ(0, tuvo_test::RunInChildAs(tuvo_test::kNobody, [&] {
+              const Db db = Connect(path_);
+              EXPECT_EQ("0", Value(db, "SELECT COUNT(*) AS value FROM t"));
+              EXPECT_EQ(-1, Execute(db, "INSERT INTO t VALUES (1)"));
+              EXPECT_EQ("attempt to write a readonly database", Error(db));
+              return 0;
+            }));
+}
+
+TEST_F(Database, NamesThatAreNoFilesMeanWhatTheyMeanToSqlite) {
+  const std::filesystem::path before = std::filesystem::current_path();
+  std::filesystem::current_path(folder_.path());
+  const Db db = Connect(":memory:");
+  EXPECT_EQ(0, Execute(db, "CREATE TABLE only_here (a)"));
+  EXPECT_EQ(-1, Execute(Connect(":memory:"), "SELECT * FROM only_here"));
+  EXPECT_FALSE(std::filesystem::exists(":memory:"));
+  std::filesystem::current_path(before);
 }
 
 TEST_F(Database, FileThatIsNoDatabaseFailsAtTheFirstStatement) {
@@ -400,6 +386,15 @@ TEST_F(Database, TransactionOfTheCallerStaysOpenAfterAFailure) {
   EXPECT_EQ("2", Count());
 }
 
+TEST_F(Database, TransactionStaysOpenThatTheTextOpenedInPlaceOfTheCallers) {
+  ASSERT_EQ(0, Execute(db_, "BEGIN; INSERT INTO t VALUES (1)"));
+  EXPECT_EQ(-1, Execute(db_, "COMMIT; BEGIN; INSERT INTO t VALUES (2); SELECT * FROM nowhere"));
+  EXPECT_TRUE(InTransaction(db_));
+  EXPECT_EQ("2", Count());
+  EXPECT_EQ(0, Execute(db_, "ROLLBACK"));
+  EXPECT_EQ("1", Count());
+}
+
 TEST_F(Database, TransactionStaysOpenAfterASuccess) {
   EXPECT_EQ(0, Execute(db_, "BEGIN; INSERT INTO t VALUES (1)"));
   EXPECT_TRUE(InTransaction(db_));
@@ -421,6 +416,18 @@ TEST_F(Database, ClosingLeavesNoDescriptor) {
     ASSERT_EQ(0, Execute(db, kPragmas));
     EXPECT_GT(OpenDescriptors(), before);
   }
+  EXPECT_EQ(before, OpenDescriptors());
+}
+
+// What the caller prepared on the connection may end later, and then takes the connection with it.
+TEST_F(Database, ClosingWithAStatementOfTheCallersLeavesNoDescriptorEither) {
+  const size_t before = OpenDescriptors();
+  Db db = Connect(path_);
+  sqlite3_stmt* statement = nullptr;
+  ASSERT_EQ(SQLITE_OK, sqlite3_prepare_v2(db->sqlite, "SELECT 1", -1, &statement, nullptr));
+  db.reset();
+  EXPECT_EQ(SQLITE_ROW, sqlite3_step(statement));
+  sqlite3_finalize(statement);
   EXPECT_EQ(before, OpenDescriptors());
 }
 
@@ -513,6 +520,26 @@ TEST_F(SharedDatabase, ChangeOfTheJournalModeIsTriedAgain) {
   EXPECT_GT(watch.Elapsed().count(), 800);
   ASSERT_NE(nullptr, rows) << Error(db_);
   EXPECT_STREQ("delete", TUVODBFetchField(rows.get(), 0, "journal_mode"));
+  EXPECT_EQ(0, holder.Wait());
+}
+
+TEST_F(SharedDatabase, WaitingTimeFromOutsideLastsUntilAStatementIsStartedOver) {
+  Gate start;
+  Gate locked;
+  Gate done;
+  Process holder(
+      [&] { return HoldLock(path_, "SELECT * FROM t", &start, &locked, &done, seconds(1)); });
+  ConnectWithLog();
+  const auto busy_timeout = [&] {
+    return std::string(TUVODBFetchField(Query(db_, "PRAGMA busy_timeout").get(), 0, "timeout"));
+  };
+  ASSERT_EQ(0, Execute(db_, "PRAGMA busy_timeout = 0"));
+  EXPECT_EQ("0", busy_timeout());
+  start.Open();
+  locked.Wait();
+  done.Open();
+  EXPECT_EQ(0, Execute(db_, "PRAGMA journal_mode = DELETE")) << Error(db_);
+  EXPECT_EQ("10000", busy_timeout());
   EXPECT_EQ(0, holder.Wait());
 }
 

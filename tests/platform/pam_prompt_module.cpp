@@ -3,11 +3,14 @@
 //   info, error  a message                        radio, binary  prompts of Linux-PAM's own kinds
 //   none         a conversation of no message     name=TEXT  makes TEXT the user's name
 //   ids=UID:GID  the effective ids that the process must have
+//   flags=NUMBER  the flags that the module must be called with
+// Asked for a session or for credentials, it leaves the file /tmp/pam-prompt-module behind.
 #include <security/pam_appl.h>
 #include <security/pam_modules.h>
 #include <unistd.h>
 
 #include <cstdlib>
+#include <fstream>
 #include <string>
 #include <vector>
 
@@ -67,10 +70,15 @@ int Ask(pam_handle_t* handle, const std::vector<Question>& questions) {
   return result;
 }
 
+int LeaveTrace() {
+  std::ofstream("/tmp/pam-prompt-module") << "asked";
+  return PAM_SUCCESS;
+}
+
 }  // namespace
 
 extern "C" __attribute__((visibility("default"))) int pam_sm_authenticate(pam_handle_t* handle,
-                                                                          int /*flags*/, int argc,
+                                                                          int flags, int argc,
                                                                           const char** argv) {
   std::vector<Question> questions;
   bool ask = false;
@@ -87,6 +95,10 @@ extern "C" __attribute__((visibility("default"))) int pam_sm_authenticate(pam_ha
       if (std::to_string(geteuid()) + ":" + std::to_string(getegid()) != text) {
         return PAM_AUTH_ERR;
       }
+    } else if (word == "flags") {
+      if (std::to_string(flags) != text) {
+        return PAM_AUTH_ERR;
+      }
     } else {
       ask = true;
       if (word != "none") {
@@ -100,5 +112,12 @@ extern "C" __attribute__((visibility("default"))) int pam_sm_authenticate(pam_ha
 extern "C" __attribute__((visibility("default"))) int pam_sm_setcred(pam_handle_t* /*handle*/,
                                                                      int /*flags*/, int /*argc*/,
                                                                      const char** /*argv*/) {
-  return PAM_SUCCESS;
+  return LeaveTrace();
+}
+
+extern "C" __attribute__((visibility("default"))) int pam_sm_open_session(pam_handle_t* /*handle*/,
+                                                                          int /*flags*/,
+                                                                          int /*argc*/,
+                                                                          const char** /*argv*/) {
+  return LeaveTrace();
 }

@@ -19,6 +19,7 @@
 #include <thread>
 #include <vector>
 
+#include "platform/failing_allocations.h"
 #include "platform/temp_folder.h"
 #include "support/child.h"
 
@@ -76,6 +77,13 @@ TEST(Process, ReadsWhatTheProgramPrints) {
   EXPECT_EQ(0, TLIBCPclose(stream));
 }
 
+TEST(Process, StreamHasNoDescriptorOfItsOwn) {
+  FILE* stream = TLIBCPopen("/bin/echo", "r", nullptr);
+  ASSERT_NE(nullptr, stream);
+  EXPECT_EQ(-1, fileno(stream));
+  TLIBCPclose(stream);
+}
+
 TEST(Process, ArgumentsReachTheProgramUnchanged) {
   const Finished finished = Finish("/usr/bin/printf", {"printf", "[%s]", "a b", "", "$HOME", "`id`",
                                                        "*", "'\"", "; exit 3", "\xc3\xbc\n"});
@@ -95,8 +103,17 @@ TEST(Process, VectorNamesItsOwnArgumentZero) {
 }
 
 TEST(Process, ReadingGivesTheChildAnEmptyInput) {
-  EXPECT_EQ("/dev/null\n", Finish("/bin/readlink", {"readlink", "/proc/self/fd/0"}).output);
-  EXPECT_EQ("", Finish("/bin/cat", {"cat"}).output);
+  const TempFolder folder;
+  const std::string path = folder / "input";
+  std::ofstream(path) << "for the parent alone";
+  EXPECT_EQ(
+      0, RunInChild([&] {
+        const int fd = open(path.c_str(), O_RDONLY | O_CLOEXEC);
+        dup2(fd, STDIN_FILENO);
+        EXPECT_EQ("/dev/null\n", Finish("/bin/readlink", {"readlink", "/proc/self/fd/0"}).output);
+        EXPECT_EQ("", Finish("/bin/cat", {"cat"}).output);
+        return 0;
+      }));
 }
 
 TEST(Process, WritingFeedsTheChildsInput) {
@@ -190,6 +207,26 @@ TEST(Process, RunningOutOfDescriptorsGivesNullAndTheReason) {
     EXPECT_EQ(lowest, next);  // nothing was left open
     close(next);
   }
+}
+
+TEST(Process, EveryLackOfMemoryGivesNullAndTheReason) {
+  const size_t before = OpenDescriptors();
+  int failing = 0;
+  for (FILE* stream = nullptr; stream == nullptr; ++failing) {
+    errno = 0;
+    tuvo_test::allocations_left = failing;
+    stream = TLIBCPopen("/bin/true", "r", "an argument", nullptr);
+    const int error = errno;
+    tuvo_test::allocations_left = -1;
+    if (stream == nullptr) {
+      ASSERT_EQ(ENOMEM, error);
+      ASSERT_EQ(-1, waitpid(-1, nullptr, WNOHANG));  // no child was started
+    } else {
+      EXPECT_EQ(0, TLIBCPclose(stream));
+    }
+  }
+  EXPECT_GT(failing, 3);
+  EXPECT_EQ(before, OpenDescriptors());
 }
 
 // Descriptors.

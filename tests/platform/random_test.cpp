@@ -114,7 +114,18 @@ TEST_F(Random, NumbersStayWithinTheirBoundsAndReachThem) {
     seen.insert(random_.random(-3, 4));
   }
   EXPECT_EQ((std::set<int>{-3, -2, -1, 0, 1, 2, 3, 4}), seen);
+}
+
+TEST_F(Random, WithoutAChoiceTheKernelIsNotAsked) {
   EXPECT_EQ(5, random_.random(5, 5));
+  EXPECT_EQ(3, random_.random(9, 3));
+  EXPECT_EQ(INT_MIN, random_.random(INT_MAX, INT_MIN));
+  EXPECT_EQ(0, calls);
+}
+
+TEST_F(Random, AHashIsDrawnWithOneCallOfTheKernel) {
+  Draw(POOL_ALPHA_NUMERIC, 9);
+  EXPECT_EQ(1, calls);
 }
 
 TEST_F(Random, NumbersComeFromTheWholeRangeOfInt) {

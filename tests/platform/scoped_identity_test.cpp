@@ -1,5 +1,6 @@
 #include "scoped_identity.h"
 
+#include <grp.h>
 #include <gtest/gtest.h>
 #include <sys/syslog.h>
 #include <unistd.h>
@@ -10,6 +11,8 @@
 #include <string>
 
 #include "support/child.h"
+#include "support/seccomp_filter.h"
+#include "support/source_line.h"
 #include "support/syslog_listener.h"
 
 namespace tuvo_platform {
@@ -75,6 +78,32 @@ TEST(ScopedIdentity, OwnIdsWithoutAGroupAreNotHalfTaken) {
   ExpectSwitch(start, 1, 1, false, start);
 }
 
+TEST(ScopedIdentity, TheRightUidStillNeedsItsGroup) {
+  ExpectSwitch({1, 1, 0, 3001, 3001, 3001}, 1, 1, true, {1, 1, 0, 3001, 1, 3001});
+  const Ids start{1, 1, 1, 3001, 3001, 3001};
+  ExpectSwitch(start, 1, 1, false, start);
+}
+
+// Root is regained on the way; when the group is then refused, the process must not stay root.
+TEST(ScopedIdentity, ASwitchThatStopsHalfwayIsUndone) {
+  if (!tuvo_test::CanRefuseCalls()) {
+    GTEST_SKIP() << "this system cannot refuse single system calls";
+  }
+  const Ids& start = tuvo_test::kSavedRoot;
+  EXPECT_EQ(RunInChildAs(start,
+                         [&] {
+                           EXPECT_TRUE(tuvo_test::RefuseCalls(
+                               {{tuvo_test::kSetresgid, EDOM, /*argument=*/1, /*value=*/1}}));
+                           errno = 0;
+                           const ScopedIdentity identity(1, 1);
+                           EXPECT_EQ(errno, EDOM);
+                           EXPECT_FALSE(identity.ok());
+                           EXPECT_EQ(ToText(CurrentIds()), ToText(start));
+                           return 0;
+                         }),
+            0);
+}
+
 TEST(ScopedIdentity, ObjectsNest) {
   EXPECT_EQ(RunInChildAs(tuvo_test::kSavedRoot,
                          [] {
@@ -87,6 +116,19 @@ TEST(ScopedIdentity, ObjectsNest) {
                            EXPECT_EQ(getegid(), 0u);
                            return 0;
                          }),
+            0);
+}
+
+TEST(ScopedIdentity, SupplementaryGroupsStay) {
+  EXPECT_EQ(tuvo_test::RunInChild([] {
+              const gid_t group = 7;
+              EXPECT_EQ(setgroups(1, &group), 0);
+              const ScopedIdentity identity(1, 1);
+              gid_t groups[8] = {};
+              EXPECT_EQ(getgroups(8, groups), 1);
+              EXPECT_EQ(groups[0], group);
+              return 0;
+            }),
             0);
 }
 
@@ -128,8 +170,10 @@ TEST(ScopedIdentity, ProcessEndsWhenItCannotReturn) {
   ASSERT_EQ(lines.size(), 1u);
   EXPECT_EQ(lines[0].facility, LOG_AUTH);
   EXPECT_EQ(lines[0].priority, LOG_CRIT);
-  EXPECT_EQ(tuvo_test::Normalized(lines[0].text),
-            "scoped_identity:LINE cannot return to uid 0 gid 0: Operation not permitted");
+  const int line =
+      tuvo_test::SourceLine("platform/src/scoped_identity.cpp", "syslog(LOG_AUTH | LOG_CRIT");
+  EXPECT_EQ(lines[0].text, "scoped_identity:" + std::to_string(line) +
+                               " cannot return to uid 0 gid 0: Operation not permitted");
 }
 
 }  // namespace

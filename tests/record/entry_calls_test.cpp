@@ -3,10 +3,15 @@
 #include <dlfcn.h>
 #include <gcrypt.h>
 #define OPENSSL_SUPPRESS_DEPRECATED
+#include <openssl/crypto.h>
 #include <openssl/md5.h>
 #include <tuvoplatform/random.h>
+#include <tuvosharing/session.h>
+#include <tuvosharing/token.h>
 
+#include <climits>
 #include <functional>
+#include <new>
 
 #include "record/record_testing.h"
 
@@ -17,6 +22,7 @@ std::time_t now = 0;
 int clock_reads = 0;
 
 struct Draw {
+  const void* generator;
   std::string pool;
   unsigned int length;
 };
@@ -25,6 +31,11 @@ bool draw_fails = false;
 std::function<void()> during_draw;
 bool sha1_fails = false;
 bool md5_fails = false;
+std::vector<size_t> compared_lengths;
+
+constexpr long kUnlimited = -1;
+long allocations_left = kUnlimited;
+long allocations_alive = 0;
 
 template <typename Function>
 Function Real(const char* name) {
@@ -54,11 +65,45 @@ __attribute__((visibility("default"))) int MD5_Init(MD5_CTX* context) {
   return md5_fails ? 0 : Real<int (*)(MD5_CTX*)>("MD5_Init")(context);
 }
 
+__attribute__((visibility("default"))) int CRYPTO_memcmp(const void* a, const void* b,
+                                                         size_t length) {
+  compared_lengths.push_back(length);
+  return Real<int (*)(const void*, const void*, size_t)>("CRYPTO_memcmp")(a, b, length);
+}
+
 }  // extern "C"
+
+void* operator new(std::size_t size, const std::nothrow_t& /*tag*/) noexcept {
+  if (allocations_left == 0) {
+    return nullptr;
+  }
+  if (allocations_left > 0) {
+    --allocations_left;
+  }
+  ++allocations_alive;
+  return std::malloc(size != 0 ? size : 1);
+}
+
+void* operator new(std::size_t size) {
+  void* memory = ::operator new(size, std::nothrow);
+  if (memory == nullptr) {
+    throw std::bad_alloc();
+  }
+  return memory;
+}
+
+void operator delete(void* memory) noexcept {
+  allocations_alive -= memory != nullptr ? 1 : 0;
+  std::free(memory);
+}
+
+void operator delete(void* memory, std::size_t /*size*/) noexcept {
+  ::operator delete(memory);
+}
 
 __attribute__((visibility("default"))) bool TUVO::RANDOM::TUVORandomBase::getString(
     const std::string& pool, unsigned int length, std::string& out) {
-  draws.push_back({pool, length});
+  draws.push_back({this, pool, length});
   if (during_draw) {
     during_draw();
   }
@@ -69,7 +114,11 @@ __attribute__((visibility("default"))) bool TUVO::RANDOM::TUVORandomBase::getStr
 namespace {
 
 using TUVO::sharing::record::Entry;
+using TUVO::sharing::record::Session;
+using TUVO::sharing::record::Token;
+using tuvo_test::Contents;
 using tuvo_test::ExpectFailed;
+using tuvo_test::FullEntry;
 using tuvo_test::LegalEntry;
 using tuvo_test::SyslogListener;
 
@@ -78,6 +127,7 @@ class EntryCalls : public testing::Test {
   EntryCalls() {
     clock_stands = draw_fails = sha1_fails = md5_fails = false;
     draws.clear();
+    compared_lengths.clear();
   }
   ~EntryCalls() override {
     clock_stands = false;
@@ -96,7 +146,7 @@ class EntryCalls : public testing::Test {
 };
 
 TEST_F(EntryCalls, ValidityTakesTheTimeOnce) {
-  const Entry entry = LegalEntry().set_start_at(1).set_expire_at(4000000000);
+  const Entry entry = LegalEntry().set_start_at(1).set_expire_at(LONG_MAX);
   clock_reads = 0;
   EXPECT_TRUE(entry.IsValid());
   EXPECT_EQ(clock_reads, 1);
@@ -133,6 +183,21 @@ TEST_F(EntryCalls, SaltsAreSixOfThePlatformsLettersAndDigits) {
   EXPECT_EQ(entry.get_protect_password_salt(), "bbbbbb");
   // sha1sum of "secretbbbbbb".
   EXPECT_EQ(entry.get_protect_password(), "2638b2144b1969758a548bfa655dc083d841c4c8");
+}
+
+TEST_F(EntryCalls, OneGeneratorServesEveryLink) {
+  const auto draw = [] {
+    Entry entry = PasswordEntry();
+    entry.set_protect_password("secret", true, Entry::ENCRYPT_ALGO_DEFAULT);
+  };
+  // At another place of the stack, were it kept there.
+  const std::function<void(int)> draw_deeper = [&](int depth) {
+    depth > 0 ? draw_deeper(depth - 1) : draw();
+  };
+  draw();
+  draw_deeper(50);
+  ASSERT_EQ(draws.size(), 2U);
+  EXPECT_EQ(draws[0].generator, draws[1].generator);
 }
 
 TEST_F(EntryCalls, NoSaltIsDrawnWhereNoneIsNeeded) {
@@ -189,6 +254,17 @@ TEST_F(EntryCalls, AFailedDigestLeavesTheLinkIllegal) {
   }
 }
 
+// How long an answer takes tells nothing about how much of a digest was right.
+TEST_F(EntryCalls, DigestsAreComparedInConstantTime) {
+  Entry entry = PasswordEntry();
+  entry.set_protect_password("secret", true, Entry::ENCRYPT_ALGO_DEFAULT);
+  EXPECT_TRUE(entry.IsPasswordValid("secret"));
+  EXPECT_FALSE(entry.IsPasswordValid("wrong"));
+  entry.set_protect_password("secret", true, Entry::ENCRYPT_ALGO_MD5);
+  EXPECT_FALSE(entry.IsPasswordValid("wrong"));
+  EXPECT_EQ(compared_lengths, (std::vector<size_t>{40, 40, 32}));
+}
+
 TEST_F(EntryCalls, NoPasswordIsValidWhileDigestsFail) {
   for (const auto algo : {Entry::ENCRYPT_ALGO_DEFAULT, Entry::ENCRYPT_ALGO_MD5}) {
     Entry entry = PasswordEntry();
@@ -200,6 +276,50 @@ TEST_F(EntryCalls, NoPasswordIsValidWhileDigestsFail) {
     EXPECT_FALSE(entry.IsPasswordValid("secret"));
     sha1_fails = md5_fails = false;
   }
+}
+
+// Runs `construct` with one allocation more each time, until it needs no more. Every time before,
+// what was missing is handed on as bad_alloc, what was allocated by then is released, and
+// `untouched` holds.
+void ExpectWholeOrNothing(const std::function<void()>& construct,
+                          const std::function<bool()>& untouched) {
+  bool whole = false;
+  long limit = 0;
+  for (; !whole; ++limit) {
+    const long before = allocations_alive;
+    allocations_left = limit;
+    try {
+      construct();
+      whole = true;
+    } catch (const std::bad_alloc&) {
+    }
+    allocations_left = kUnlimited;
+    if (!whole) {
+      EXPECT_EQ(allocations_alive, before) << "with " << limit;
+      EXPECT_TRUE(untouched()) << "with " << limit;
+    }
+  }
+  EXPECT_GT(limit, 1) << "nothing was refused";
+}
+
+template <typename Record>
+void ExpectConstructorsAreWholeOrNothing(const Record& full) {
+  const auto fields = full.GetFieldList();
+  ExpectWholeOrNothing([] { const Record made; }, [] { return true; });
+  ExpectWholeOrNothing([&] { const Record made(full); },
+                       [&] { return full.GetFieldList() == fields; });
+  Record source(full);
+  ExpectWholeOrNothing([&] { const Record made(std::move(source)); },
+                       [&] { return source.GetFieldList() == fields; });
+}
+
+TEST_F(EntryCalls, WithoutMemoryARecordIsNotConstructedAndNothingIsLost) {
+  const std::string text = "a text that is too long for the small-string buffer";
+  Session session;
+  session.set_session_id(text).set_ip(text);
+  ExpectConstructorsAreWholeOrNothing(Token());
+  ExpectConstructorsAreWholeOrNothing(session);
+  ExpectConstructorsAreWholeOrNothing(FullEntry());
 }
 
 }  // namespace

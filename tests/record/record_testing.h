@@ -3,6 +3,7 @@
 #define TESTS_RECORD_RECORD_TESTING_H_
 
 #include <gtest/gtest.h>
+#include <sys/types.h>
 #include <syslog.h>
 #include <tuvosharing/base_db.h>
 #include <tuvosharing/entry.h>
@@ -22,6 +23,7 @@
 #include <utility>
 #include <vector>
 
+#include "support/source_line.h"
 #include "support/syslog_listener.h"
 
 namespace tuvo_test {
@@ -60,36 +62,27 @@ inline std::string Quoted(const std::string& text) {
   return "'" + ScratchDB().Escape(text) + "'";
 }
 
-// The line of a failed check.
-inline std::string FailedLine(const std::string& source, const std::string& condition,
-                              int error = 0) {
-  return source + ":LINE (PID) Failed [" + condition + "], err=" + std::strerror(error) + "\n\n";
+// What the check of `condition` in record/<source>.cpp logs when it fails in process `pid`.
+inline std::string FailedLine(const std::string& source, const std::string& condition, int error,
+                              pid_t pid) {
+  const int line =
+      SourceLine("record/" + source + ".cpp", "SHARING_RETURN_FALSE_IF(" + condition + ");");
+  return source + ":" + std::to_string(line) + " (" + std::to_string(pid) + ") Failed [" +
+         condition + "], err=" + std::strerror(error) + "\n\n";
 }
 
 // Expects that since the last look exactly these conditions were logged, in this order, as the
-// record `source` logs them.
+// record `source` logs them in this process, or in `pid`.
 inline void ExpectFailed(SyslogListener& log, const std::string& source,
-                         const std::vector<std::string>& conditions, int error = 0) {
+                         const std::vector<std::string>& conditions, int error = 0,
+                         pid_t pid = getpid()) {
   const std::vector<LogLine> lines = log.Take();
   ASSERT_EQ(lines.size(), conditions.size());
   for (size_t i = 0; i < lines.size(); ++i) {
     EXPECT_EQ(lines[i].facility, LOG_USER);
     EXPECT_EQ(lines[i].priority, LOG_ERR);
-    EXPECT_EQ(Normalized(lines[i].text), FailedLine(source, conditions[i], error));
+    EXPECT_EQ(lines[i].text, FailedLine(source, conditions[i], error, pid));
   }
-}
-
-// The line of record/<source>.cpp that a log line names.
-inline std::string NamedSourceLine(const std::string& text) {
-  const size_t colon = text.find(':');
-  const std::string folder =
-      std::string(__FILE__).substr(0, std::string(__FILE__).rfind("/tests/"));
-  std::ifstream file(folder + "/record/" + text.substr(0, colon) + ".cpp");
-  std::string line;
-  for (int left = std::atoi(text.c_str() + colon + 1); left > 0; --left) {
-    std::getline(file, line);
-  }
-  return line;
 }
 
 // Calls body(now) until the whole call has happened within the second `now`, and returns its last

@@ -21,6 +21,12 @@ extern "C" __attribute__((visibility("default"))) int __lsan_is_turned_off() {
 
 namespace tuvo_test {
 
+namespace {
+
+pid_t last_child = 0;
+
+}  // namespace
+
 Ids CurrentIds() {
   Ids ids{};
   getresuid(&ids.ruid, &ids.euid, &ids.suid);
@@ -56,6 +62,7 @@ int RunInChild(const std::function<int()>& body) {
     // exit, not _exit: process-wide objects are to be destroyed as in a real program.
     std::exit(code);
   }
+  last_child = pid;
   int status = 0;
   while (waitpid(pid, &status, 0) < 0 && errno == EINTR) {
   }
@@ -71,6 +78,10 @@ int RunInChildAs(const Ids& ids, const std::function<int()>& body) {
     }
     return body();
   });
+}
+
+pid_t LastChild() {
+  return last_child;
 }
 
 }  // namespace tuvo_test

@@ -35,6 +35,9 @@ int RunInChild(const std::function<int()>& body);
 // The same after dropping supplementary groups and taking `ids`. 252: the ids could not be taken.
 int RunInChildAs(const Ids& ids, const std::function<int()>& body);
 
+// The id of the process that one of the two ran last: it stands in what that process logged.
+pid_t LastChild();
+
 }  // namespace tuvo_test
 
 #endif  // TESTS_SUPPORT_CHILD_H_

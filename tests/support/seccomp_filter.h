@@ -3,6 +3,7 @@
 #ifndef TESTS_SUPPORT_SECCOMP_FILTER_H_
 #define TESTS_SUPPORT_SECCOMP_FILTER_H_
 
+#include <linux/audit.h>
 #include <linux/filter.h>
 #include <linux/seccomp.h>
 #include <sys/prctl.h>
@@ -31,6 +32,28 @@ constexpr long kChmod = __NR_fchmodat;
 #endif
 constexpr long kGetrandom = __NR_getrandom;
 
+// Every call that changes an id, or the groups, of a process. 32-bit x86 has each of them twice:
+// for ids of 16 bits and of 32.
+constexpr long kIdChanges[] = {
+    __NR_setuid,      __NR_setgid,      __NR_setreuid,   __NR_setregid,   __NR_setresuid,
+    __NR_setresgid,   __NR_setgroups,   __NR_setfsuid,   __NR_setfsgid,
+#ifdef __NR_setresuid32
+    __NR_setuid32,    __NR_setgid32,    __NR_setreuid32, __NR_setregid32, __NR_setresuid32,
+    __NR_setresgid32, __NR_setgroups32, __NR_setfsuid32, __NR_setfsgid32,
+#endif
+};
+
+// The kind of system calls that this program makes; call numbers mean nothing without it.
+#if defined(__x86_64__)
+constexpr std::uint32_t kCallKind = AUDIT_ARCH_X86_64;
+#elif defined(__i386__)
+constexpr std::uint32_t kCallKind = AUDIT_ARCH_I386;
+#elif defined(__aarch64__)
+constexpr std::uint32_t kCallKind = AUDIT_ARCH_AARCH64;
+#else
+#error "which AUDIT_ARCH_ is this machine's?"
+#endif
+
 constexpr int kAnyArgument = -1;
 constexpr int kKill = -1;
 
@@ -52,6 +75,10 @@ inline bool RefuseCalls(const std::vector<Refusal>& refusals) {
   const auto skip_unless = [&](std::uint32_t value, std::uint8_t count) {
     program.push_back(BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, value, 0, count));
   };
+  // Calls of another kind, which only a program for another machine could make, have other numbers.
+  load(offsetof(seccomp_data, arch));
+  program.push_back(BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, kCallKind, 1, 0));
+  program.push_back(BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_KILL_PROCESS));
   for (const Refusal& refusal : refusals) {
     const bool any = refusal.argument == kAnyArgument;
     load(offsetof(seccomp_data, nr));
@@ -77,6 +104,15 @@ inline bool RefuseCalls(const std::vector<Refusal>& refusals) {
                          prctl(PR_SET_SECCOMP, SECCOMP_MODE_FILTER, &filter, 0, 0) == 0;
   errno = error;
   return installed;
+}
+
+// From now on every call that changes an id ends this process, with SIGSYS.
+inline bool EndAtIdChanges() {
+  std::vector<Refusal> refusals;
+  for (const long call : kIdChanges) {
+    refusals.push_back({call, kKill});
+  }
+  return RefuseCalls(refusals);
 }
 
 // Whether RefuseCalls works on this system; asked in a child.

@@ -18,8 +18,13 @@ struct Key {
   const char* text;
 };
 
+// Takes nothing but a variable of exactly this type.
+const char* const* Variable(const char*& variable) {
+  return &variable;
+}
+
 #define KEY(name, text) \
-  { #name, &name, text }
+  { #name, Variable(TUVO::sharing::name), text }
 
 const Key kKeys[] = {
     KEY(SZK_UID_, "uid"),
@@ -74,7 +79,7 @@ const Key kKeys[] = {
     KEY(SZK_EXTERNAL_IP_, "external_ip"),
     KEY(SZK_ACTION, "action"),
     KEY(SZF_SHARING_DB_PATH, "/usr/tuvo/etc/private/session/sharing.db"),
-    {"SZ_X_SHARING_HEADER", &::SZ_X_SHARING_HEADER, "HTTP_X_TUVO_SHARING"},
+    {"SZ_X_SHARING_HEADER", Variable(::SZ_X_SHARING_HEADER), "HTTP_X_TUVO_SHARING"},
 };
 
 #undef KEY

@@ -10,6 +10,7 @@
 #include <vector>
 
 #include "support/syslog_listener.h"
+#include "support/written_line.h"
 
 namespace {
 
@@ -52,7 +53,9 @@ TEST(Log, PriorityIsErrorAndTheFacilityTheDefaultOne) {
   SyslogListener listener;
   SHARING_LOG("one");
   SHARING_LOG_PID("two");
-  for (const LogLine& line : listener.Take()) {
+  const std::vector<LogLine> lines = listener.Take();
+  ASSERT_EQ(lines.size(), 2U);
+  for (const LogLine& line : lines) {
     EXPECT_EQ(line.priority, LOG_ERR);
     EXPECT_EQ(line.facility, LOG_USER);
   }
@@ -102,7 +105,10 @@ TEST(ErrorText, IsTheTextOfErrnoAndLeavesIt) {
   }
 }
 
+int refusing_line = 0;
+
 bool RefusesNegative(int number) {
+  refusing_line = __LINE__ + 2;
   // clang-format off
   SHARING_RETURN_FALSE_IF(0 > number &&   "" != std::string( "a"));
   // clang-format on
@@ -115,10 +121,10 @@ TEST(ReturnFalseIf, AConditionThatHoldsIsLoggedWithItsSourceTextAndErrno) {
   EXPECT_FALSE(RefusesNegative(-1));
   const std::vector<LogLine> lines = listener.Take();
   ASSERT_EQ(lines.size(), 1U);
-  EXPECT_EQ(tuvo_test::Normalized(lines[0].text),
-            "log_test:LINE (PID) Failed [0 > number && \"\" != std::string( \"a\")], "
-            "err=No space left on device\n\n");
-  EXPECT_EQ(lines[0].priority, LOG_ERR);
+  EXPECT_EQ(tuvo_test::Written(lines[0]),
+            "user.err log_test:" + std::to_string(refusing_line) + " (" + Pid() +
+                ") Failed [0 > number && \"\" != std::string( \"a\")], "
+                "err=No space left on device\n\n");
 }
 
 TEST(ReturnFalseIf, AConditionThatDoesNotHoldIsPassedInSilence) {

@@ -7,13 +7,17 @@
 #include <openssl/md5.h>
 #include <tuvosharing/utils.h>
 
+#include <cstdarg>
 #include <new>
 #include <string>
 #include <vector>
 
+#include "support/syslog_listener.h"
+
 namespace {
 
 std::string failing;             // the one function that fails
+unsigned int other_length = 0;   // when set, the length that libgcrypt tells of its digest
 std::vector<std::string> calls;  // what was called, in order
 
 int Answer(const char* name) {
@@ -45,20 +49,33 @@ int MD5_Final(unsigned char* digest, MD5_CTX* context) {
 }
 
 gcry_error_t gcry_control(enum gcry_ctl_cmds command, ...) {
-  calls.push_back(command == GCRYCTL_DISABLE_SECMEM            ? "DISABLE_SECMEM"
-                  : command == GCRYCTL_INITIALIZATION_FINISHED ? "INITIALIZATION_FINISHED"
-                                                               : "another command");
+  va_list arguments;
+  va_start(arguments, command);
+  const int argument = va_arg(arguments, int);
+  va_end(arguments);
+  const std::string name = command == GCRYCTL_DISABLE_SECMEM            ? "DISABLE_SECMEM"
+                           : command == GCRYCTL_INITIALIZATION_FINISHED ? "INITIALIZATION_FINISHED"
+                                                                        : "another command";
+  calls.push_back(name + " " + std::to_string(argument));
   return Real<decltype(&gcry_control)>("gcry_control")(command, 0);
 }
 
+unsigned int gcry_md_get_algo_dlen(int algo) {
+  calls.push_back("length of " + std::string(gcry_md_algo_name(algo)));
+  return other_length != 0 ? other_length
+                           : Real<decltype(&gcry_md_get_algo_dlen)>("gcry_md_get_algo_dlen")(algo);
+}
+
 void gcry_md_hash_buffer(int algo, void* digest, const void* buffer, size_t length) {
-  calls.emplace_back("gcry_md_hash_buffer");
+  calls.push_back(std::string(gcry_md_algo_name(algo)) + " of " +
+                  std::string(static_cast<const char*>(buffer), length));
   Real<decltype(&gcry_md_hash_buffer)>("gcry_md_hash_buffer")(algo, digest, buffer, length);
 }
 
 }  // extern "C"
 
 void* operator new[](std::size_t size, const std::nothrow_t& /*tag*/) noexcept {
+  calls.push_back("room for " + std::to_string(size));
   if (failing == "new") {
     return nullptr;
   }
@@ -82,6 +99,7 @@ class PasswordHashFailure : public testing::Test {
 
   static void Reset(const std::string& name) {
     failing = name;
+    other_length = 0;
     calls.clear();
   }
 };
@@ -108,9 +126,10 @@ TEST_F(PasswordHashFailure, AnEmptyPasswordAsksOpensslForNothing) {
   EXPECT_EQ(calls, Calls{});
 }
 
-TEST_F(PasswordHashFailure, Sha1MakesLibgcryptReadyBeforeEveryDigest) {
+TEST_F(PasswordHashFailure, Sha1MakesLibgcryptReadyBeforeEveryDigestThatItMakesInOneCall) {
   std::string out;
-  const Calls once{"DISABLE_SECMEM", "INITIALIZATION_FINISHED", "gcry_md_hash_buffer"};
+  const Calls once{"DISABLE_SECMEM 0", "INITIALIZATION_FINISHED 0", "length of SHA1", "SHA1 of abc",
+                   "room for 41"};
   for (int i = 0; i < 2; ++i) {
     calls.clear();
     EXPECT_TRUE(Sha1WithSaltHashPassword("ab", "c", out));
@@ -123,6 +142,30 @@ TEST_F(PasswordHashFailure, Sha1WithoutMemoryFailsAndLeavesTheOutputAlone) {
   std::string out = "kept";
   EXPECT_FALSE(Sha1WithSaltHashPassword("ab", "c", out));
   EXPECT_EQ(out, "kept");
+}
+
+// There is room for 20 bytes; a libgcrypt that has no such digest tells 0.
+TEST_F(PasswordHashFailure, ADigestOfAnotherLengthIsNotMade) {
+  for (const unsigned int length : {19U, 21U, 64U}) {
+    Reset("");
+    other_length = length;
+    std::string out = "kept";
+    EXPECT_FALSE(Sha1WithSaltHashPassword("ab", "c", out));
+    EXPECT_EQ(out, "kept");
+    EXPECT_EQ(calls.back(), "length of SHA1");
+  }
+}
+
+TEST_F(PasswordHashFailure, NoFailureIsLogged) {
+  tuvo_test::SyslogListener listener;
+  for (const char* step : {"MD5_Init", "MD5_Update", "MD5_Final", "new"}) {
+    Reset(step);
+    std::string out;
+    MD5HashPassword("", out);
+    MD5HashPassword("abc", out);
+    Sha1WithSaltHashPassword("ab", "c", out);
+  }
+  EXPECT_EQ(listener.TakeTexts(), Calls{});
 }
 
 }  // namespace

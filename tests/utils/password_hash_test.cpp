@@ -1,7 +1,12 @@
 #include <gtest/gtest.h>
 #include <tuvosharing/utils.h>
 
+#include <atomic>
 #include <string>
+#include <thread>
+#include <vector>
+
+#include "support/child.h"
 
 namespace {
 
@@ -72,6 +77,31 @@ TEST(Sha1WithSaltHashPassword, MayWriteOverItsArguments) {
   std::string text = "ab";
   EXPECT_TRUE(Sha1WithSaltHashPassword(text, "c", text));
   EXPECT_EQ(text, kSha1OfAbc);
+}
+
+// The first calls of a process, which make libgcrypt ready, are among them.
+TEST(PasswordHash, ThreadsMayMakeDigestsAtTheSameTime) {
+  EXPECT_EQ(tuvo_test::RunInChild([] {
+              std::vector<std::thread> threads;
+              std::atomic<int> right{0};
+              for (int i = 0; i < 8; ++i) {
+                threads.emplace_back([&right] {
+                  for (int round = 0; round < 500; ++round) {
+                    std::string md5;
+                    std::string sha1;
+                    right += MD5HashPassword("abc", md5) && md5 == kMd5OfAbc ? 1 : 0;
+                    right +=
+                        Sha1WithSaltHashPassword("ab", "c", sha1) && sha1 == kSha1OfAbc ? 1 : 0;
+                  }
+                });
+              }
+              for (std::thread& thread : threads) {
+                thread.join();
+              }
+              EXPECT_EQ(right, 8000);
+              return 0;
+            }),
+            0);
 }
 
 TEST(Sha1WithSaltHashPassword, IsTheSameEveryTime) {

@@ -2,8 +2,11 @@
 #include <gtest/gtest.h>
 #include <tuvosharing/utils.h>
 
+#include <atomic>
 #include <cerrno>
 #include <limits>
+#include <thread>
+#include <vector>
 
 #include "support/child.h"
 #include "support/seccomp_filter.h"
@@ -49,6 +52,18 @@ TEST(IsProbabilityHit, HitsAsOftenAsAsked) {
 TEST(IsProbabilityHit, TheFractionOfAPerCentIsCutOff) {
   EXPECT_NEAR(Hits(0.015F, 100000), 1000, 315);
   EXPECT_EQ(Hits(0.009F, 10000), 0);
+}
+
+TEST(IsProbabilityHit, ThreadsMayAskAtTheSameTime) {
+  std::vector<std::thread> threads;
+  std::atomic<int> hits{0};
+  for (int i = 0; i < 8; ++i) {
+    threads.emplace_back([&hits] { hits += Hits(1.0F, 500) + Hits(0.0F, 500); });
+  }
+  for (std::thread& thread : threads) {
+    thread.join();
+  }
+  EXPECT_EQ(hits, 4000);
 }
 
 // A purge that does not run is the harmless failure.

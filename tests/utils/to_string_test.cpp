@@ -39,6 +39,9 @@ TEST(ToString, AnIntIsDecimalWithAMinusSign) {
 TEST(ToString, ALongIsDecimalWithAMinusSign) {
   EXPECT_EQ(ToString<long const>(1700000000L), "1700000000");
   EXPECT_EQ(ToString<long const>(-1L), "-1");
+  EXPECT_EQ(ToString<long const>(0L), "0");
+  EXPECT_EQ(ToString<long const>(2147483647L), "2147483647");
+  EXPECT_EQ(ToString<long const>(-2147483647L - 1), "-2147483648");
   EXPECT_EQ(ToString<long const>(LONG_MAX), std::to_string(LONG_MAX));
 }
 

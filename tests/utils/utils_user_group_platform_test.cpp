@@ -9,11 +9,14 @@
 #include <cstdio>
 #include <cstring>
 #include <map>
+#include <optional>
 #include <set>
 #include <string>
 #include <vector>
 
+#include "support/source_line.h"
 #include "support/syslog_listener.h"
+#include "support/written_line.h"
 
 namespace {
 
@@ -22,6 +25,7 @@ constexpr int kNoSuchUser = -1;
 struct Platform {
   std::map<std::string, std::string> conversions;
   int convert_failure = 0;
+  bool convert_writes_all_the_same = false;
   unsigned int buffer_size = 0;  // as last passed
   bool buffer_was_zero = false;
   std::map<std::string, unsigned int> users;
@@ -29,7 +33,7 @@ struct Platform {
   bool record_on_failure = false;  // a record all the same
   bool no_groups_answer = false;
   std::vector<std::string> groups;
-  int groups_count = -1;  // when set, the count that the list tells
+  std::optional<int> groups_count;  // when set, the count that the list tells
   std::map<std::string, unsigned int> gids;
   std::vector<std::string> asked;  // names asked for, in order
   int records = 0;                 // handed out and not freed
@@ -55,6 +59,9 @@ int TUVOUserLoginNameConvert(const char* name, char* real, unsigned int size) {
   }
   const auto found = platform.conversions.find(name);
   if (found == platform.conversions.end()) {
+    if (platform.convert_writes_all_the_same) {
+      std::snprintf(real, size, "half");
+    }
     return platform.convert_failure;
   }
   std::snprintf(real, size, "%s", found->second.c_str());
@@ -134,8 +141,7 @@ TLIBSZHASH* TLIBGroupInfoHashGet(const char* user, int kind, int flags) {
   }
   ++platform.lists;
   auto* list = new TLIBSZHASH{};
-  list->nItem =
-      platform.groups_count >= 0 ? platform.groups_count : static_cast<int>(platform.groups.size());
+  list->nItem = platform.groups_count.value_or(static_cast<int>(platform.groups.size()));
   list->rgszItem = new char*[platform.groups.size()];
   for (size_t i = 0; i < platform.groups.size(); ++i) {
     list->rgszItem[i] = strdup(platform.groups[i].c_str());
@@ -192,9 +198,17 @@ TEST_F(UserGroupPlatform, TheBufferForTheConvertedNameIs493ZeroBytes) {
   EXPECT_TRUE(platform.buffer_was_zero);
 }
 
-TEST_F(UserGroupPlatform, AnErrorOfTheConversionLeavesTheNameAsItIs) {
-  platform.convert_failure = -1;
-  EXPECT_EQ(GetRealUsername("alice"), "alice");
+TEST_F(UserGroupPlatform, AnAnswerOfZeroOrBelowLeavesTheNameAsItIs) {
+  platform.convert_writes_all_the_same = true;
+  for (const int answer : {0, -1}) {
+    platform.convert_failure = answer;
+    EXPECT_EQ(GetRealUsername("alice"), "alice") << answer;
+  }
+}
+
+TEST_F(UserGroupPlatform, AnAnswerOfOneIsAConversion) {
+  platform.conversions["alice"] = "b";
+  EXPECT_EQ(GetRealUsername("alice"), "b");
 }
 
 TEST_F(UserGroupPlatform, NullIsNeverHandedToTheConversion) {
@@ -221,9 +235,10 @@ TEST_F(UserGroupPlatform, TheLineOfAnUnknownUserShowsTheConvertedName) {
   SyslogListener listener;
   TUVOUSER* user = nullptr;
   EXPECT_FALSE(UserGet("who@domain", user));
-  const Texts texts = listener.TakeTexts();
-  ASSERT_EQ(texts.size(), 1U);
-  EXPECT_EQ(tuvo_test::Normalized(texts[0]), "utils_user_group:LINE No such user [DOMAIN\\who]");
+  const int line = tuvo_test::SourceLine("utils/utils_user_group.cpp", "\"No such user [%s]\"");
+  EXPECT_EQ(
+      tuvo_test::TakeWritten(listener),
+      Texts{"user.err utils_user_group:" + std::to_string(line) + " No such user [DOMAIN\\who]"});
 }
 
 TEST_F(UserGroupPlatform, AnErrorOtherThanMinusOneCountsAsSuccessInSilence) {
@@ -255,6 +270,24 @@ TEST_F(UserGroupPlatform, ARecordThatComesWithAFailureIsFreedAndNotUsed) {
   EXPECT_FALSE(GIDToGroup(9999, name));
   EXPECT_EQ(uid, 77U);
   EXPECT_EQ(name, "kept");
+}
+
+TEST_F(UserGroupPlatform, ASuccessWithoutARecordIsNone) {
+  platform.failure = 0;
+  unsigned int uid = 77;
+  std::string name = "kept";
+  EXPECT_FALSE(UserToUID("mallory", uid));
+  EXPECT_FALSE(UIDToUser(9999, name));
+  EXPECT_FALSE(GIDToGroup(9999, name));
+  EXPECT_EQ(uid, 77U);
+  EXPECT_EQ(name, "kept");
+}
+
+TEST_F(UserGroupPlatform, NamesForIdsAreNotConverted) {
+  std::string name;
+  EXPECT_TRUE(UIDToUser(3001, name));
+  EXPECT_TRUE(GIDToGroup(11, name));
+  EXPECT_EQ(platform.buffer_size, 0U);
 }
 
 TEST_F(UserGroupPlatform, EveryAnswerButZeroIsNoName) {
@@ -304,10 +337,12 @@ TEST_F(UserGroupPlatform, AnAccountInNoGroupYieldsNothing) {
 }
 
 TEST_F(UserGroupPlatform, ACountBelowOneIsNoGroup) {
-  platform.groups_count = 0;
-  Gids gids{99};
-  EXPECT_TRUE(Groups({"one"}, gids));
-  EXPECT_EQ(gids, Gids{99});
+  for (const int count : {0, -1}) {
+    platform.groups_count = count;
+    Gids gids{99};
+    EXPECT_TRUE(Groups({"one"}, gids)) << count;
+    EXPECT_EQ(gids, Gids{99}) << count;
+  }
 }
 
 TEST_F(UserGroupPlatform, WithoutAnAnswerTheGroupsFail) {
