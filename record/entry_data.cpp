@@ -45,21 +45,25 @@ Entry::RedirectType ToRedirectType(const std::string& text) {
                                                   : Entry::REDIRECT_ALWAYS;
 }
 
-// Each reads the JSON type it is for and, as its empty value, null; false for any other type.
+// Each reads what JSON's own conversions make of the value, null being the empty value; false for
+// what has none: the document may have been written by another program.
 bool Read(const Json::Value& value, bool& out) {
-  out = value.isBool() && value.asBool();
-  return value.isBool() || value.isNull();
+  if (!value.isConvertibleTo(Json::booleanValue)) {
+    return false;
+  }
+  out = value.asBool();
+  return true;
 }
 
 bool Read(const Json::Value& value, std::string& out) {
-  if (value.isString()) {
-    out = value.asString();
-  } else {
-    out.clear();
+  if (!value.isConvertibleTo(Json::stringValue)) {
+    return false;
   }
-  return value.isString() || value.isNull();
+  out = value.asString();
+  return true;
 }
 
+// An id is never made of anything but a number: null and false would be root's.
 bool Read(const Json::Value& value, unsigned int& out) {
   if (!value.isUInt()) {
     return false;

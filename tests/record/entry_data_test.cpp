@@ -6,6 +6,7 @@
 #include <functional>
 #include <limits>
 #include <locale>
+#include <map>
 #include <random>
 
 #include "record/record_testing.h"
@@ -286,14 +287,36 @@ TEST(EntryData, ThatIsNoObjectChangesNothing) {
   }
 }
 
-TEST(EntryData, WithAMemberOfAnotherTypeChangesNothing) {
-  for (const char* wrong : {"1", "0", "1.5", "\"true\"", "[]", "{}"}) {
+TEST(EntryData, NumbersAreBooleansWhereOneBelongs) {
+  for (const auto& [number, expected] :
+       std::map<std::string, bool>{{"0", false}, {"1", true}, {"-1", true}, {"1.5", true}}) {
+    Entry entry;
+    EXPECT_TRUE(LoadData(Document("enable_match_ip", number), entry)) << number;
+    EXPECT_EQ(entry.get_enable_match_ip(), expected) << number;
+  }
+}
+
+TEST(EntryData, NumbersAndBooleansAreTextsWhereOneBelongs) {
+  for (const auto& [value, expected] : std::map<std::string, std::string>{
+           {"1", "1"}, {"-5", "-5"}, {"1.5", "1.5"}, {"true", "true"}, {"false", "false"}}) {
+    Entry entry;
+    EXPECT_TRUE(LoadData(Document("protect_title", value), entry)) << value;
+    EXPECT_EQ(entry.get_protect_title(), expected);
+    EXPECT_TRUE(LoadData(Document("protect_extra_users", "[" + value + "]"), entry));
+    EXPECT_EQ(Strings(DataOf(entry)["protect_extra_users"]), Texts{expected});
+    EXPECT_TRUE(LoadData(Document("protect_type", value), entry));
+    EXPECT_EQ(entry.get_protect_type(), Entry::PROTECT_USER);
+  }
+}
+
+TEST(EntryData, WithAMemberThatHasNoConversionChangesNothing) {
+  for (const char* wrong : {"\"true\"", "[]", "{}"}) {
     ExpectRefused(Document("enable_match_ip", wrong));
   }
   for (const char* member :
        {"protect_type", "protect_title", "protect_password", "protect_password_algo",
         "protect_password_salt", "redirect_type", "redirect_uri"}) {
-    for (const char* wrong : {"1", "1.5", "true", "false", "[]", "{}", "[\"none\"]"}) {
+    for (const char* wrong : {"[]", "{}", "[\"none\"]"}) {
       ExpectRefused(Document(member, wrong));
     }
   }
@@ -306,7 +329,7 @@ TEST(EntryData, WithAMemberOfAnotherTypeChangesNothing) {
   }
   for (const char* member : {"protect_extra_users", "protect_extra_groups"}) {
     for (const char* wrong :
-         {"{}", "{\"0\":\"x\"}", "\"x\"", "1", "true", "[null]", "[\"x\",1]", "[true]", "[[]]"}) {
+         {"{}", "{\"0\":\"x\"}", "\"x\"", "1", "true", "[null]", "[[]]", "[{}]"}) {
       ExpectRefused(Document(member, wrong));
     }
   }
