@@ -3,6 +3,7 @@
 // platform, hence it is one of its own.
 #include <dlfcn.h>
 #include <gtest/gtest.h>
+#include <pthread.h>
 #include <syslog.h>
 #include <tuvoplatform/database.h>
 #include <tuvoplatform/file.h>
@@ -39,6 +40,7 @@ std::function<void()> at_execute;  // runs within the next statement
 
 std::vector<size_t> scratches;  // taken from the heap, by size
 bool no_memory = false;         // for the next one
+bool on_stack = false;          // whether the last text was escaped into the thread's stack
 
 int within = 0;  // calls of the platform among its own functions are its own business
 
@@ -56,6 +58,17 @@ std::string Text(const char* text) {
 std::optional<int> Answer(const char* name) {
   const auto found = answers.find(name);
   return found == answers.end() ? std::nullopt : std::optional<int>(found->second);
+}
+
+bool IsOnStack(const char* place) {
+  pthread_attr_t attributes;
+  void* lowest = nullptr;
+  size_t size = 0;
+  EXPECT_EQ(pthread_getattr_np(pthread_self(), &attributes), 0);
+  EXPECT_EQ(pthread_attr_getstack(&attributes, &lowest, &size), 0);
+  pthread_attr_destroy(&attributes);
+  const char* bottom = static_cast<const char*>(lowest);
+  return std::less_equal<>()(bottom, place) && std::less<>()(place, bottom + size);
 }
 
 // The platform's own function.
@@ -134,6 +147,7 @@ int TUVODBEscapeStringEX2(TUVODB* db, char* out, unsigned int size, const char* 
                           unsigned int length) {
   Note(std::string("TUVODBEscapeStringEX2(") + (db == nullptr ? "null" : "connection") + "," +
        std::to_string(size) + "," + std::string(text, length) + "," + std::to_string(length) + ")");
+  on_stack = IsOnStack(out);
   const int real = REAL(TUVODBEscapeStringEX2)(db, out, size, text, length);
   return Answer("TUVODBEscapeStringEX2").value_or(real);
 }
@@ -486,9 +500,11 @@ TEST_F(BaseDBPlatform, OrdinaryTextsAreEscapedWithoutTheHeap) {
   Open();
   for (const size_t length : {0, 1, 1000, 32767, 32768}) {
     EXPECT_EQ(db_->Escape(std::string(length, '\'')).size(), 2 * length);
+    EXPECT_TRUE(on_stack) << length;
   }
   EXPECT_EQ(scratches, std::vector<size_t>{});
   EXPECT_EQ(db_->Escape(std::string(32769, '\'')).size(), 65538U);
+  EXPECT_FALSE(on_stack);
   EXPECT_EQ(scratches, std::vector<size_t>{65538});
 }
 

@@ -120,6 +120,8 @@ TEST(BaseDB, ItsTableHasTheDestructorAloneAndItHoldsOnePointer) {
 TEST(BaseDB, ItsFieldsStandInTheirOrder) {
   const BaseDBPrivate db("/tmp", kMode);
   EXPECT_TRUE(tuvo_test::StandInThisOrder(db, MembersOf(db)));
+  EXPECT_TRUE((std::is_same_v<tuvo_test::TypesOf<decltype(MembersOf(db))>,
+                              std::tuple<bool, std::string, TUVODB*, std::string, std::string>>));
 }
 
 TEST(BaseDB, CannotBeCopied) {

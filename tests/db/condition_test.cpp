@@ -7,6 +7,7 @@
 #include <climits>
 #include <locale>
 #include <string>
+#include <tuple>
 #include <type_traits>
 #include <vector>
 
@@ -254,6 +255,41 @@ TEST_F(ConditionTest, ItsTableHasTheDestructorAloneAndItHoldsOnePointer) {
 TEST_F(ConditionTest, ItsFieldsStandInTheirOrder) {
   const TUVO::sharing::db::ConditionPrivate fields(db_);
   EXPECT_TRUE(tuvo_test::StandInThisOrder(fields, MembersOf(fields)));
+  using Types = tuvo_test::TypesOf<decltype(MembersOf(fields))>;
+  EXPECT_TRUE((std::is_same_v<std::tuple_element_t<2, Types>, int>));
+  EXPECT_TRUE((std::is_same_v<std::tuple_element_t<3, Types>, int>));
+}
+
+// A structured binding names all members in their order.
+TEST_F(ConditionTest, AClauseKeepsColumnValueRawTextAndItsWord) {
+  TUVO::sharing::db::ConditionPrivate fields(db_);
+  fields.Where("a", "1", true);
+  const auto& clauses = fields.*std::get<0>(MembersOf(fields));
+  const auto& clause = clauses.at(0);
+  EXPECT_TRUE(
+      (std::is_same_v<decltype(clauses), const std::vector<std::decay_t<decltype(clause)>>&>));
+  const auto& [column, value, raw, is_and] = clause;
+  EXPECT_TRUE((std::is_same_v<decltype(column), const std::string>));
+  EXPECT_TRUE((std::is_same_v<decltype(value), const std::string>));
+  EXPECT_TRUE((std::is_same_v<decltype(raw), const std::string>));
+  EXPECT_TRUE((std::is_same_v<decltype(is_and), const bool>));
+  EXPECT_EQ(&column, &clause.column);
+  EXPECT_EQ(&value, &clause.value);
+  EXPECT_EQ(&raw, &clause.raw);
+  EXPECT_EQ(&is_and, &clause.is_and);
+}
+
+TEST_F(ConditionTest, ASortKeyKeepsColumnAndDirection) {
+  TUVO::sharing::db::ConditionPrivate fields(db_);
+  fields.OrderBy("a", true);
+  const auto& keys = fields.*std::get<1>(MembersOf(fields));
+  const auto& key = keys.at(0);
+  EXPECT_TRUE((std::is_same_v<decltype(keys), const std::vector<std::decay_t<decltype(key)>>&>));
+  const auto& [column, ascending] = key;
+  EXPECT_TRUE((std::is_same_v<decltype(column), const std::string>));
+  EXPECT_TRUE((std::is_same_v<decltype(ascending), const bool>));
+  EXPECT_EQ(&column, &key.column);
+  EXPECT_EQ(&ascending, &key.ascending);
 }
 
 TEST_F(ConditionTest, CannotBeCopied) {

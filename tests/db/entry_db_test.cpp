@@ -165,6 +165,26 @@ TEST_F(EntryDBTest, CountAndQueryUseTheStoresConditionOnce) {
   EXPECT_EQ(entries.size(), 2U);
 }
 
+TEST_F(EntryDBTest, OnlyCountAndQueryUseTheConditionUp) {
+  store_->GetCondition().Where("owner_uid", "7");
+  const std::string sql = store_->GetCondition().GetSQL();
+  Entry entry = LegalEntry("one");
+  EXPECT_TRUE(store_->Create(entry));
+  EXPECT_TRUE(store_->CreateWithHash(entry));
+  EXPECT_TRUE(store_->Update(entry));
+  Entry found;
+  EXPECT_TRUE(store_->GetById(entry.get_id(), found));
+  EXPECT_TRUE(store_->GetByHash(entry.get_hash(), found));
+  EXPECT_TRUE(store_->GetByToken(LegalToken(entry.get_id(), 1), found));
+  EXPECT_TRUE(store_->Delete(entry.get_id()));
+  EXPECT_TRUE(store_->Delete(entry));
+  EXPECT_TRUE(store_->DeleteByOwnerUid(1026));
+  EXPECT_TRUE(store_->PurgeExpired(0.0F));
+  EXPECT_TRUE(store_->PurgeExpired(1.0F));
+  EXPECT_TRUE(store_->PurgeExpiredByOwnerProject(1026, "photo"));
+  EXPECT_EQ(store_->GetCondition().GetSQL(), sql);
+}
+
 TEST_F(EntryDBTest, AQueryLeavesRowsOutThatLoadAsIllegal) {
   Add(LegalEntry("one"));
   ASSERT_TRUE(
@@ -451,6 +471,16 @@ TEST_F(EntryDBTest, ASkippedPurgeRunsNothingAndSucceeds) {
   }
   EXPECT_EQ(Seen(), nothing_);
   EXPECT_EQ(Hashes(), Lines{"expired"});
+}
+
+TEST_F(EntryDBTest, APurgeWithAProbabilityBetweenRunsAtSomeCalls) {
+  int runs = 0;
+  for (int i = 0; i < 200; ++i) {
+    EXPECT_TRUE(store_->PurgeExpired(0.5F));
+    runs += Seen() != nothing_ ? 1 : 0;
+  }
+  EXPECT_GT(runs, 30);
+  EXPECT_LT(runs, 170);
 }
 
 TEST_F(EntryDBTest, APurgeThatFailsAnswersFalseAndASkippedOneDoesNot) {

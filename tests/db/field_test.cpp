@@ -3,7 +3,9 @@
 
 #include <climits>
 #include <locale>
+#include <sstream>
 #include <string>
+#include <tuple>
 #include <type_traits>
 #include <utility>
 
@@ -172,6 +174,9 @@ TEST(Field, ItsTableHasTheDestructorAloneAndTheTextStandsBeforeTheStream) {
   const Field field("42");
   EXPECT_TRUE(std::has_virtual_destructor_v<Field>);
   EXPECT_TRUE(tuvo_test::StandInThisOrder(field, MembersOf(field)));
+  EXPECT_TRUE((std::is_same_v<tuvo_test::TypesOf<decltype(MembersOf(field))>,
+                              std::tuple<std::string, std::stringstream>>));
+  EXPECT_EQ(sizeof(Field), sizeof(void*) + sizeof(std::string) + sizeof(std::stringstream));
   if (tuvo_test::kTablesCanBeRead) {
     EXPECT_EQ(tuvo_test::SlotCount<Field>(), 2U);
   }

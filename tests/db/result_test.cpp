@@ -5,6 +5,7 @@
 #include <tuvosharing/result.h>
 
 #include <string>
+#include <tuple>
 #include <type_traits>
 #include <utility>
 #include <vector>
@@ -191,6 +192,9 @@ TEST_F(ResultTest, ItsTableHasTheDestructorAloneAndTheCursorStandsBeforeTheHandl
   const Result result;
   EXPECT_TRUE(std::has_virtual_destructor_v<Result>);
   EXPECT_TRUE(tuvo_test::StandInThisOrder(result, MembersOf(result)));
+  EXPECT_TRUE((std::is_same_v<tuvo_test::TypesOf<decltype(MembersOf(result))>,
+                              std::tuple<unsigned int, DBResult_tag*>>));
+  EXPECT_EQ(sizeof(Result), 3 * sizeof(void*)) << "the table's pointer and these two";
   if (tuvo_test::kTablesCanBeRead) {
     EXPECT_EQ(tuvo_test::SlotCount<Result>(), 2U);
   }
@@ -225,6 +229,16 @@ TEST_F(ResultTest, MovingOntoAnotherFreesWhatThatHeld) {
     EXPECT_FALSE(source.IsGood());  // NOLINT(bugprone-use-after-move)
   }
   EXPECT_EQ(freed, (std::vector<DBResult_tag*>{&other_, &handle_}));
+}
+
+TEST_F(ResultTest, MovingOntoAnotherHandsThePlaceOver) {
+  Result source(&handle_);
+  Row row;
+  EXPECT_TRUE(source.NextRow(row));
+  Result target;
+  target = std::move(source);
+  EXPECT_TRUE(target.NextRow(row));
+  EXPECT_EQ(cursors, (std::vector<unsigned int>{0, 10}));
 }
 
 TEST_F(ResultTest, MovingOntoItselfKeepsTheHandle) {

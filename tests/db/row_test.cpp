@@ -4,6 +4,7 @@
 
 #include <memory>
 #include <string>
+#include <tuple>
 #include <type_traits>
 
 #include "support/class_layout.h"
@@ -114,6 +115,9 @@ TEST_F(RowTest, ItsTableHasTheDestructorAloneAndTheResultStandsBeforeTheNumber) 
   const Row row;
   EXPECT_TRUE(std::has_virtual_destructor_v<Row>);
   EXPECT_TRUE(tuvo_test::StandInThisOrder(row, MembersOf(row)));
+  EXPECT_TRUE((std::is_same_v<tuvo_test::TypesOf<decltype(MembersOf(row))>,
+                              std::tuple<DBResult_tag*, unsigned int>>));
+  EXPECT_EQ(sizeof(Row), 3 * sizeof(void*)) << "the table's pointer and these two";
   if (tuvo_test::kTablesCanBeRead) {
     EXPECT_EQ(tuvo_test::SlotCount<Row>(), 2U);
   }

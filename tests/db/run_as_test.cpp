@@ -5,14 +5,28 @@
 #include <unistd.h>
 
 #include <cerrno>
+#include <cstddef>
 #include <stdexcept>
 #include <string>
+#include <string_view>
+#include <tuple>
+#include <type_traits>
 #include <vector>
 
 #include "identity_lines.h"
 #include "support/child.h"
+#include "support/class_layout.h"
 #include "support/seccomp_filter.h"
 #include "support/syslog_listener.h"
+
+namespace tuvo_test {
+
+using Guard = _________::__;
+auto MembersOf(const Guard&);
+template struct Reveal<Guard, &Guard::saved_uid_, &Guard::saved_gid_, &Guard::source_,
+                       &Guard::line_, &Guard::name_>;
+
+}  // namespace tuvo_test
 
 namespace {
 
@@ -24,6 +38,7 @@ using tuvo_test::kSavedRoot;
 using tuvo_test::kSetresgid;
 using tuvo_test::kSetresuid;
 using tuvo_test::kSystem;
+using tuvo_test::MembersOf;
 using tuvo_test::RefuseCalls;
 using tuvo_test::RunInChildAs;
 using tuvo_test::SyslogListener;
@@ -74,6 +89,19 @@ void ExpectFailure(const Ids& start, uid_t uid, gid_t gid, const std::string& te
                          }),
             0);
   EXPECT_EQ(TakeWritten(listener), Lines{"auth.err " + kSeenAs + text});
+}
+
+TEST(RunAs, TheGuardKeepsUserGroupSourceLineAndName) {
+  const tuvo_test::Guard guard("run_as_test", 1, "IF_RUN_AS");
+  const auto members = MembersOf(guard);
+  EXPECT_TRUE((std::is_same_v<tuvo_test::TypesOf<std::decay_t<decltype(members)>>,
+                              std::tuple<uid_t, gid_t, std::string_view, int, const char*>>));
+  constexpr std::ptrdiff_t kIds = sizeof(uid_t) + sizeof(gid_t);
+  constexpr std::ptrdiff_t kLine = kIds + std::ptrdiff_t{sizeof(std::string_view)};
+  constexpr std::ptrdiff_t kName = kLine + std::ptrdiff_t{sizeof(void*)};
+  EXPECT_EQ(tuvo_test::Offsets(guard, members),
+            (std::vector<std::ptrdiff_t>{0, sizeof(uid_t), kIds, kLine, kName}));
+  EXPECT_EQ(sizeof guard, sizeof(void*) + kName);
 }
 
 TEST(RunAs, RootTakesTheSystemIdentityAndReturns) {

@@ -147,6 +147,24 @@ TEST_F(SessionDBTest, CountAndQueryUseTheStoresConditionOnce) {
   EXPECT_TRUE(store_->GetCondition().IsEmpty());
 }
 
+TEST_F(SessionDBTest, OnlyCountAndQueryUseTheConditionUp) {
+  store_->GetCondition().Where("session_id", "two");
+  const std::string sql = store_->GetCondition().GetSQL();
+  Session session = LegalSession("one");
+  EXPECT_TRUE(store_->Create(session));
+  EXPECT_TRUE(store_->CreateWithSessionId(session));
+  EXPECT_TRUE(store_->Update(session));
+  Session found;
+  EXPECT_TRUE(store_->GetById(session.get_id(), found));
+  EXPECT_TRUE(store_->GetBySessionId(session.get_session_id(), found));
+  EXPECT_TRUE(store_->Delete(session.get_id()));
+  EXPECT_TRUE(store_->Delete(session));
+  EXPECT_TRUE(store_->DeleteBySessionId("one"));
+  EXPECT_TRUE(store_->PurgeExpired(0.0F));
+  EXPECT_TRUE(store_->PurgeExpired(1.0F));
+  EXPECT_EQ(store_->GetCondition().GetSQL(), sql);
+}
+
 TEST_F(SessionDBTest, ItsEndRunsACheckpoint) {
   store_.reset();
   EXPECT_EQ(db_.GetLastQuery(), "PRAGMA wal_checkpoint;");
@@ -244,6 +262,17 @@ TEST_F(SessionDBTest, TheFirstIdentifierThatIsFreeIsTaken) {
     EXPECT_EQ(session.get_session_id().size(), 32U);
     EXPECT_EQ(Tried().size(), static_cast<size_t>(refused));
   }
+}
+
+TEST_F(SessionDBTest, AnIllegalSessionIsTriedAsOftenAndNeverStored) {
+  Session session = LegalSession("former");
+  session.set_ip("");
+  EXPECT_FALSE(store_->CreateWithSessionId(session));
+  EXPECT_EQ(session.get_session_id().size(), 32U);
+  EXPECT_EQ(Seen(), nothing_);
+  const Lines lines = TakeLines(listener_);
+  ASSERT_EQ(lines.size(), 102U);
+  EXPECT_EQ(lines[101], "object_db:LINE (PID) obj invalid\n");
 }
 
 TEST_F(SessionDBTest, WithoutARandomSourceNothingWeakerIsStored) {
@@ -377,6 +406,16 @@ TEST_F(SessionDBTest, ASkippedPurgeRunsNothingAndSucceeds) {
   EXPECT_TRUE(store_->PurgeExpired(0.0F));
   EXPECT_EQ(Seen(), nothing_);
   EXPECT_EQ(Identifiers(), Lines{"late"});
+}
+
+TEST_F(SessionDBTest, APurgeWithAProbabilityBetweenRunsAtSomeCalls) {
+  int runs = 0;
+  for (int i = 0; i < 200; ++i) {
+    EXPECT_TRUE(store_->PurgeExpired(0.5F));
+    runs += Seen() != nothing_ ? 1 : 0;
+  }
+  EXPECT_GT(runs, 30);
+  EXPECT_LT(runs, 170);
 }
 
 TEST_F(SessionDBTest, APurgeThatFailsAnswersFalseInSilence) {

@@ -23,6 +23,8 @@ namespace {
 
 std::string failing_statement;
 bool no_row = false;
+bool row_of_nothing = false;  // the version comes without rows, of which there is one all the same
+bool empty_version = false;
 std::function<void()> at_first_row;
 
 }  // namespace
@@ -34,6 +36,10 @@ int TUVODBExecute(TUVODB* db, const char* sql, DBResult_tag** result) {
     *result = nullptr;
     errno = EIO;
     return -1;
+  }
+  if (row_of_nothing && std::strcmp(sql, "PRAGMA user_version") == 0) {
+    *result = nullptr;
+    return 0;
   }
   return reinterpret_cast<decltype(&TUVODBExecute)>(dlsym(RTLD_NEXT, "TUVODBExecute"))(db, sql,
                                                                                        result);
@@ -47,8 +53,19 @@ int TUVODBFetchRow(DBResult_tag* result, unsigned int* row) {
   if (no_row) {
     return -1;
   }
+  if (row_of_nothing) {
+    return 0;
+  }
   return reinterpret_cast<decltype(&TUVODBFetchRow)>(dlsym(RTLD_NEXT, "TUVODBFetchRow"))(result,
                                                                                          row);
+}
+
+const char* TUVODBFetchField(DBResult_tag* result, unsigned int row, const char* name) {
+  if (empty_version && std::strcmp(name, "user_version") == 0) {
+    return "";
+  }
+  return reinterpret_cast<decltype(&TUVODBFetchField)>(dlsym(RTLD_NEXT, "TUVODBFetchField"))(
+      result, row, name);
 }
 
 }  // extern "C"
@@ -74,6 +91,8 @@ class SharingDBPlatform : public testing::Test {
   ~SharingDBPlatform() override {
     failing_statement.clear();
     no_row = false;
+    row_of_nothing = false;
+    empty_version = false;
     at_first_row = nullptr;
   }
 
@@ -98,6 +117,19 @@ TEST_F(SharingDBPlatform, AVersionWithoutARowFails) {
   no_row = true;
   ExpectNotMigrated();
   EXPECT_EQ(TakeWritten(listener_), Lines{tuvo_test::NoVersion()});
+}
+
+TEST_F(SharingDBPlatform, ARowThatIsNotGoodFails) {
+  row_of_nothing = true;
+  ExpectNotMigrated();
+  EXPECT_EQ(TakeWritten(listener_), Lines{tuvo_test::NoVersion()});
+}
+
+TEST_F(SharingDBPlatform, AVersionThatIsNoNumberIsZero) {
+  empty_version = true;
+  EXPECT_TRUE(SharingDB(path_).IsGood());
+  EXPECT_EQ(tuvo_test::SqliteFile(path_).Value("PRAGMA user_version"), "2");
+  EXPECT_EQ(TakeWritten(listener_), Lines{});
 }
 
 TEST_F(SharingDBPlatform, AScriptThatFailsIsLoggedWithTheSystemsReason) {

@@ -163,6 +163,23 @@ TEST_F(TokenDBTest, CountAndQueryUseTheStoresConditionOnce) {
   EXPECT_TRUE(store_->GetCondition().IsEmpty());
 }
 
+TEST_F(TokenDBTest, OnlyCountAndQueryUseTheConditionUp) {
+  store_->GetCondition().Where("entry_id", "1");
+  const std::string sql = store_->GetCondition().GetSQL();
+  Token token = LegalToken(1, 1);
+  EXPECT_TRUE(store_->Create(token));
+  EXPECT_TRUE(store_->Update(token));
+  Token found;
+  EXPECT_TRUE(store_->GetById(token.get_id(), found));
+  EXPECT_TRUE(store_->GetBySessionEntry(sessions_[0], entries_[0], found));
+  EXPECT_TRUE(store_->Delete(token.get_id()));
+  EXPECT_TRUE(store_->Delete(token));
+  EXPECT_TRUE(store_->PurgeByEntry(entries_[0]));
+  EXPECT_TRUE(store_->PurgeExpired(0.0F));
+  EXPECT_TRUE(store_->PurgeExpired(1.0F));
+  EXPECT_EQ(store_->GetCondition().GetSQL(), sql);
+}
+
 TEST_F(TokenDBTest, ItsEndRunsACheckpoint) {
   store_.reset();
   EXPECT_EQ(db_.GetLastQuery(), "PRAGMA wal_checkpoint;");
@@ -310,6 +327,16 @@ TEST_F(TokenDBTest, ASkippedPurgeRunsNothingAndSucceeds) {
   EXPECT_TRUE(store_->PurgeExpired(0.0F));
   EXPECT_EQ(Seen(), nothing_);
   EXPECT_EQ(Pairs(), Lines{"1/1"});
+}
+
+TEST_F(TokenDBTest, APurgeWithAProbabilityBetweenRunsAtSomeCalls) {
+  int runs = 0;
+  for (int i = 0; i < 200; ++i) {
+    EXPECT_TRUE(store_->PurgeExpired(0.5F));
+    runs += Seen() != nothing_ ? 1 : 0;
+  }
+  EXPECT_GT(runs, 30);
+  EXPECT_LT(runs, 170);
 }
 
 TEST_F(TokenDBTest, APurgeThatFailsAnswersFalseInSilence) {

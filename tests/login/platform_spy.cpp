@@ -1,6 +1,7 @@
 #include "login/platform_spy.h"
 
 #include <dlfcn.h>
+#include <pthread.h>
 #include <tuvoplatform/account.h>
 #include <tuvoplatform/auto_block.h>
 #include <tuvoplatform/cgi.h>
@@ -100,6 +101,9 @@ int TuvoCgiLogin(TUVOCGI* cgi, char* reply, unsigned int size, const LoginInfo* 
                  login->nFlag,
                  size,
                  tuvo_test::IsZero(reply, size)};
+  if (Spy().at_login) {
+    Spy().at_login();
+  }
   return Forward("TuvoCgiLogin", Spy().answer, &TuvoCgiLogin, "TuvoCgiLogin", cgi, reply, size,
                  login);
 }
@@ -153,6 +157,12 @@ void TUVOUserFree(TUVOUSER* user) {
 TLIBSZHASH* TLIBGroupInfoHashGet(const char* user, int kind, int flags) {
   return Forward(std::string("TLIBGroupInfoHashGet ") + user, static_cast<TLIBSZHASH*>(nullptr),
                  &TLIBGroupInfoHashGet, "TLIBGroupInfoHashGet", user, kind, flags);
+}
+
+int pthread_create(pthread_t* thread, const pthread_attr_t* attributes, void* (*body)(void*),
+                   void* argument) noexcept {
+  ++Spy().threads;
+  return tuvo_test::Real(&pthread_create, "pthread_create")(thread, attributes, body, argument);
 }
 
 std::time_t time(std::time_t* out) noexcept {

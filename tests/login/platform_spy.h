@@ -7,6 +7,7 @@
 #define TESTS_LOGIN_PLATFORM_SPY_H_
 
 #include <ctime>
+#include <functional>
 #include <map>
 #include <optional>
 #include <string>
@@ -38,6 +39,11 @@ struct PlatformSpy {
   int answer = -1;
   // Runs out of memory instead.
   bool throws = false;
+
+  // What happens when an account is about to log in; nothing if empty.
+  std::function<void()> at_login;
+
+  int threads = 0;  // how many threads were started
 
   // What TUVOUserLoginNameConvert makes of a name; names that are not here need no conversion.
   std::map<std::string, std::string> real_names;

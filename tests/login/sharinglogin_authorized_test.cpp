@@ -1,5 +1,6 @@
 // The check of every later request of a visitor.
 #include <sys/stat.h>
+#include <tuvoplatform/auto_block.h>
 #include <unistd.h>
 
 #include <filesystem>
@@ -34,6 +35,10 @@ class IsAuthorized : public VisitTest {
 
   // The visitor's next request.
   Visit Next() const { return Visit(hash_).Session(id_); }
+
+  Reply CheckWithoutParameters() {
+    return Run(Visit(), [](std::string&) { return TUVO::TuvoSharingIsAuthorized(nullptr); });
+  }
 
   // Everything that a check might change.
   std::vector<TextRow> Everything() {
@@ -135,14 +140,21 @@ TEST_F(IsAuthorized, ADeniedAddressKeepsWhatItHas) {
   LogInTo(MakePasswordLink());
   FailLogins(10);
   EXPECT_EQ(1, Check(Next()).code);
+  EXPECT_EQ(1, TuvoCgiIsDeniedIP(kAddress));
+}
+
+TEST_F(IsAuthorized, FailedLoginsAreNotClearedByACheckThatPasses) {
+  LogInTo(MakePasswordLink());
+  FailLogins(9);
+  EXPECT_EQ(1, Check(Next()).code);
+  EXPECT_EQ(9, FailedLogins());
 }
 
 // What a request must bring.
 
 TEST_F(IsAuthorized, FailsWithoutParameters) {
   LogInTo(MakePasswordLink());
-  const Reply reply =
-      Run(Visit(), [](std::string&) { return TUVO::TuvoSharingIsAuthorized(nullptr); });
+  const Reply reply = CheckWithoutParameters();
   EXPECT_EQ(-4, reply.code);
   EXPECT_EQ(Lines{}, reply.log);
 }
@@ -392,6 +404,9 @@ TEST_F(IsAuthorized, AddressesAreComparedByteByByte) {
     Change(std::string("UPDATE session SET ip = '") + ip + "'");
     ExpectRefused(-8, {std::string("sharinglogin:LINE ip not match, 192.0.2.1, ") + ip}, Next());
   }
+  Change("UPDATE session SET ip = '2001:DB8::1'");
+  ExpectRefused(-8, {"sharinglogin:LINE ip not match, 2001:db8::1, 2001:DB8::1"},
+                Next().From("2001:db8::1"));
 }
 
 TEST_F(IsAuthorized, OneAddressMayBeSpelledInManyWays) {
@@ -449,8 +464,7 @@ TEST_F(IsAuthorized, AnExceptionEndsInsideTheLibrary) {
 TEST_F(IsAuthorized, FailsWithoutAUsableDatabase) {
   LogInTo(MakePasswordLink());
   Change("PRAGMA user_version = -1");  // no script leads on from there
-  for (const Visit& visit : {Next(), Visit()}) {
-    const Reply reply = Check(visit);
+  for (const Reply& reply : {Check(Next()), Check(Visit()), CheckWithoutParameters()}) {
     EXPECT_EQ(-4, reply.code);
     EXPECT_EQ(Lines{"sharinglogin:LINE db is not good"}, OwnLines(reply.log));
   }
@@ -500,6 +514,15 @@ TEST_F(IsAuthorized, MovesTheFileWhateverTheRequestBrings) {
   ASSERT_EQ(0, chown(kDatabase, 0, 0));
   ASSERT_EQ(0, chmod(kDatabase, 0600));
   EXPECT_EQ(-4, Check(Visit()).code);
+  EXPECT_FALSE(Exists(kDatabase));
+  EXPECT_TRUE(Exists(kMovedDatabase));
+}
+
+TEST_F(IsAuthorized, MovesTheFileEvenWithoutParameters) {
+  LogInTo(MakePasswordLink());
+  ASSERT_EQ(0, chown(kDatabase, 0, 0));
+  ASSERT_EQ(0, chmod(kDatabase, 0600));
+  EXPECT_EQ(-4, CheckWithoutParameters().code);
   EXPECT_FALSE(Exists(kDatabase));
   EXPECT_TRUE(Exists(kMovedDatabase));
 }

@@ -84,6 +84,21 @@ TEST_F(LinkLogin, ChangesNothingElseOfTheLink) {
   EXPECT_EQ(before, Rows(columns));
 }
 
+// An account's login takes its time, in which others may be counted, or the link changed.
+TEST_F(LinkLogin, CountsTheUseOfTheLinkAsItIsThen) {
+  const Visit visit = AliceAt(MakeAccountLink());
+  Run(visit, [&](std::string& session_id) {
+    Spy().at_login = [] {
+      SqliteFile(kDatabase).Execute("UPDATE entry SET use_count = 5, enabled = 0");
+    };
+    _tag_sharing_login_params params = visit.Params();
+    EXPECT_EQ(1, TUVO::TuvoSharingLogin(session_id, &params, false));
+    return 0;
+  });
+  EXPECT_EQ("6", UseCount());
+  EXPECT_EQ("0", Value("SELECT enabled FROM entry"));
+}
+
 // What a request must bring.
 
 TEST_F(LinkLogin, WithoutParametersFails) {
@@ -95,9 +110,26 @@ TEST_F(LinkLogin, WithoutParametersFails) {
   EXPECT_EQ(Lines{}, reply.log);
 }
 
+// The first call makes the file, whatever it is given.
+TEST_F(LinkLogin, OpensTheDatabaseEvenWithoutParameters) {
+  ASSERT_FALSE(std::filesystem::exists(kDatabase));
+  const Reply reply = Run(Visit(), [](std::string& session_id) {
+    return TUVO::TuvoSharingLogin(session_id, nullptr, false);
+  });
+  EXPECT_EQ(-4, reply.code);
+  EXPECT_TRUE(std::filesystem::exists(kDatabase));
+}
+
 TEST_F(LinkLogin, WithoutAHashFails) {
   MakeLink();
-  const Reply reply = Login(Visit());
+  const Visit visit;
+  const Reply reply = Run(visit, [&](std::string& session_id) {
+    Spy().calls.clear();
+    _tag_sharing_login_params params = visit.Params();
+    const int code = TUVO::TuvoSharingLogin(session_id, &params, false);
+    EXPECT_EQ(Lines{}, Spy().calls);
+    return code;
+  });
   ExpectRefused(-4, reply);
   EXPECT_EQ(Lines{}, reply.log);
 }
@@ -182,13 +214,26 @@ TEST_F(LinkLogin, OnlyTheAnswerOneDeniesTheAddress) {
   }
 }
 
+TEST_F(LinkLogin, ADeniedAddressIsCountedNoFurther) {
+  FailLogins(3);
+  const Visit visit(MakeLink());
+  const Reply reply = Run(visit, [&](std::string& session_id) {
+    Spy().failing = "TuvoCgiIsDeniedIP";  // the service itself counts no address that it denies
+    Spy().answer = 1;
+    _tag_sharing_login_params params = visit.Params();
+    return TUVO::TuvoSharingLogin(session_id, &params, false);
+  });
+  EXPECT_EQ(-8, reply.code);
+  EXPECT_EQ(3, FailedLogins());
+}
+
 TEST_F(LinkLogin, AsksForTheAddressItself) {
   const Visit visit = Visit(MakeLink()).From("2001:DB8:0::1");
   Run(visit, [&](std::string& session_id) {
     Spy().calls.clear();
     _tag_sharing_login_params params = visit.Params();
     EXPECT_EQ(1, TUVO::TuvoSharingLogin(session_id, &params, false));
-    // Once for the deny list, and once more when the use is counted.
+    // Once for the deny list, and once more for the session.
     EXPECT_EQ((Lines{"TuvoCgiGetRemoteIP", "TuvoCgiIsDeniedIP 2001:db8::1", "TuvoCgiGetRemoteIP"}),
               Spy().calls);
     return 0;
@@ -206,6 +251,13 @@ TEST_F(LinkLogin, GoesOnWhenItCannotBeToldWhetherTheAddressIsDenied) {
   for (const std::string& line : reply.log) {
     EXPECT_EQ(0U, line.find("auto_block:LINE ")) << line;
   }
+}
+
+TEST_F(LinkLogin, AFailureThatCannotBeCountedIsToldAllTheSame) {
+  const std::string hash = MakePasswordLink();
+  std::ofstream(kAutoBlock) << std::string(4096, 'x');
+  ASSERT_EQ(0, chown(kAutoBlock, 1, 1));
+  ExpectRefused(-9, Login(Visit(hash).Password("wrong")));
 }
 
 // The link.
@@ -525,21 +577,27 @@ TEST_F(LinkLogin, AnExpiredTokenIsRenewedNotDoubled) {
 
 // Both lives begin when they are written down, not when the request came.
 TEST_F(LinkLogin, TheClockIsReadForTheSessionAndAgainForTheToken) {
-  const Visit visit(MakeLink());
-  const std::time_t begin = std::time(nullptr);
-  Run(visit, [&](std::string& session_id) {
-    Spy().now = begin;
-    Spy().step = 10;
-    _tag_sharing_login_params params = visit.Params();
-    EXPECT_EQ(1, TUVO::TuvoSharingLogin(session_id, &params, false));
-    return 0;
-  });
-  const long session = std::stol(Value("SELECT timeout FROM session"));
-  const long token = std::stol(Value("SELECT timeout FROM token"));
-  EXPECT_GE(session, begin + kDay);
-  EXPECT_GT(token, session);
-  EXPECT_EQ(0, (session - begin - kDay) % 10);
-  EXPECT_EQ(0, (token - begin - kDay) % 10);
+  const std::string hash = MakeLink();
+  const auto log_in = [&](const Visit& visit) {
+    const std::time_t begin = std::time(nullptr);
+    const Reply reply = Run(visit, [&](std::string& session_id) {
+      Spy().now = begin;
+      Spy().step = 10;
+      _tag_sharing_login_params params = visit.Params();
+      EXPECT_EQ(1, TUVO::TuvoSharingLogin(session_id, &params, false));
+      return 0;
+    });
+    const long session = std::stol(Value("SELECT timeout FROM session"));
+    const long token = std::stol(Value("SELECT timeout FROM token"));
+    EXPECT_GE(session, begin + kDay);
+    EXPECT_GT(token, session);
+    EXPECT_EQ(0, (session - begin - kDay) % 10);
+    EXPECT_EQ(0, (token - begin - kDay) % 10);
+    return reply.session_id;
+  };
+  const std::string id = log_in(Visit(hash));
+  EXPECT_EQ(id, log_in(Visit(hash).Session(id)));  // renews both
+  EXPECT_EQ("1", Tokens());
 }
 
 // Times end in 2038 where they have 32 bits; a day that would begin anew at the other end would
@@ -601,12 +659,13 @@ TEST_F(LinkLogin, TakesATokenBackThatCannotBeRenewed) {
   const std::string id = LoggedIn(Visit(hash));
   const std::string other = LoggedIn(Visit(hash));
   Break("UPDATE", "token");
-  const Reply reply = Login(Visit(hash).Session(id));
+  const auto sessions = Rows("SELECT * FROM session");
+  const Reply reply = Login(Visit(hash).Session(id).From(kOtherAddress));
   EXPECT_EQ(-4, reply.code);
   EXPECT_EQ(kUntouched, reply.session_id);
   EXPECT_EQ(Lines{"object_db:LINE (PID) update failed\n"}, reply.log);
   EXPECT_EQ("3", UseCount());
-  EXPECT_EQ("2", Sessions());
+  EXPECT_EQ(sessions, Rows("SELECT * FROM session")) << "it is written after the token";
   EXPECT_EQ(Rows("SELECT id FROM session WHERE session_id = '" + other + "'"),
             Rows("SELECT session_id FROM token"));
 }
@@ -624,6 +683,19 @@ TEST_F(LinkLogin, TakesTheTokenBackWhenTheSessionCannotBeWritten) {
   EXPECT_EQ("1", Sessions());
   EXPECT_EQ(kNoUser, Value("SELECT uid FROM session"));
   EXPECT_EQ(3, FailedLogins());
+}
+
+TEST_F(LinkLogin, TakesTheTokenBackWhenAKnownSessionCannotBeWritten) {
+  const std::string hash = MakeLink();
+  const std::string id = LoggedIn(Visit(hash));
+  const auto sessions = Rows("SELECT * FROM session");
+  Break("UPDATE", "session");
+  const Reply reply = Login(Visit(hash).Session(id).From(kOtherAddress));
+  EXPECT_EQ(-4, reply.code);
+  EXPECT_EQ(kUntouched, reply.session_id);
+  EXPECT_EQ(Lines{"object_db:LINE (PID) update failed\n"}, reply.log);
+  EXPECT_EQ("0", Tokens());
+  EXPECT_EQ(sessions, Rows("SELECT * FROM session"));
 }
 
 TEST_F(LinkLogin, FailsAlsoWhenTheTokenCannotBeTakenBack) {
@@ -679,24 +751,32 @@ TEST_F(LinkLogin, AVisitStartsNoThread) {
     EXPECT_TRUE(TUVO::TuvoSharingLogout(params.sharing_id, session_id));
     const std::filesystem::directory_iterator threads("/proc/self/task");
     EXPECT_EQ(1, std::distance(begin(threads), end(threads)));
+    EXPECT_EQ(0, Spy().threads);  // nor one that ended again
     return 0;
   });
 }
 
 TEST_F(LinkLogin, LeavesTheParametersAsTheyWere) {
-  const Visit visit =
-      Visit(MakePasswordLink()).Password("sesame").Account("alice", "wrong").Session("unknown");
-  const Visit copy = visit;
-  Run(visit, [&](std::string& session_id) {
-    _tag_sharing_login_params params = visit.Params();
+  const Visit visit = AliceAt(MakeAccountLink()).Password("sesame").Session("unknown");
+  const auto expect_only_read = [](const Visit& brought, const auto& operation) {
+    const Visit copy = brought;
+    _tag_sharing_login_params params = brought.Params();
     const _tag_sharing_login_params pointers = params;
-    EXPECT_EQ(1, TUVO::TuvoSharingLogin(session_id, &params, false));
+    EXPECT_EQ(1, operation(params));
     EXPECT_EQ(0, std::memcmp(&pointers, &params, sizeof params));
     EXPECT_STREQ(copy.Params().sharing_id, params.sharing_id);
     EXPECT_STREQ(copy.Params().password, params.password);
     EXPECT_STREQ(copy.Params().zor_username, params.zor_username);
     EXPECT_STREQ(copy.Params().zor_password, params.zor_password);
     EXPECT_STREQ(copy.Params().sharing_sid, params.sharing_sid);
+  };
+  Run(visit, [&](std::string& session_id) {
+    expect_only_read(visit, [&](_tag_sharing_login_params& params) {
+      return TUVO::TuvoSharingLogin(session_id, &params, false);
+    });
+    expect_only_read(Visit(visit).Session(session_id), [](const _tag_sharing_login_params& params) {
+      return TUVO::TuvoSharingIsAuthorized(&params);
+    });
     return 0;
   });
 }

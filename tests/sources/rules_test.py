@@ -1,5 +1,5 @@
 #!/usr/bin/env python3
-"""Checks that every rule of the ledger in docs/rules/ names a test that is there.
+"""Checks that every rule of the ledger in docs/rules/ names a test that is there, and one alone.
 
     rules_test.py PROJECT_FOLDER
 
@@ -7,8 +7,11 @@ A rule is a list item that ends in the names of its tests, `Suite.Case` for the 
 name for the scripts:
 
     - A link with an empty owner is not legal. `EntryIsLegal.NotWithoutAnOwner`
+
+No two C++ tests have the same name, in different programs either: the rule would not tell which.
 """
 
+import collections
 import pathlib
 import re
 import sys
@@ -16,13 +19,20 @@ import sys
 TEST = re.compile(r"^\s*(?:TEST|TEST_F|TEST_P|TYPED_TEST)\((\w+),\s*(\w+)\)", re.MULTILINE)
 
 
+def cpp_tests_of(project):
+    """The C++ tests' names, each with the files that define it."""
+    names = collections.defaultdict(list)
+    for path in sorted((project / "tests").rglob("*.cpp")):
+        for suite, case in TEST.findall(path.read_text()):
+            names[f"{suite}.{case}"].append(str(path.relative_to(project)))
+    return names
+
+
 def tests_of(project):
     """Every name under which the ledger may call a test."""
-    names = set()
+    names = set(cpp_tests_of(project))
     for path in (project / "tests").rglob("*"):
-        if path.suffix == ".cpp":
-            names.update(f"{suite}.{case}" for suite, case in TEST.findall(path.read_text()))
-        elif path.suffix == ".py":
+        if path.suffix == ".py":
             names.update(f"{path.name}:{case}" for case in
                          re.findall(r"^\s*def (test_\w+)\(", path.read_text(), re.MULTILINE))
         if path.suffix in (".py", ".sh"):
@@ -39,7 +49,9 @@ def items_of(text):
 def main():
     project = pathlib.Path(sys.argv[1])
     known = tests_of(project)
-    wrong, rules = [], 0
+    wrong = [f"{name} is the name of several tests: {', '.join(files)}"
+             for name, files in cpp_tests_of(project).items() if len(files) > 1]
+    rules = 0
     for page in sorted((project / "docs" / "rules").glob("*.md")):
         for item in items_of(page.read_text()):
             rules += 1
@@ -53,7 +65,7 @@ def main():
     print("\n".join(wrong))
     if rules == 0:
         sys.exit("the ledger holds no rules")
-    print(f"{rules} rules, {len(wrong)} without their test")
+    print(f"{rules} rules, {len(wrong)} faults")
     sys.exit(1 if wrong else 0)
 
 

@@ -6,6 +6,7 @@
 #include <cstddef>
 #include <cstring>
 #include <tuple>
+#include <type_traits>
 #include <vector>
 
 namespace tuvo_test {
@@ -42,17 +43,26 @@ std::vector<std::ptrdiff_t> Offsets(const Class& object, const Members& members)
   return std::apply([&](auto... member) { return std::vector{offset(member)...}; }, members);
 }
 
-// Whether the members follow one another in memory, the first right behind the pointer to the table
-// of virtual operations.
+constexpr std::size_t RoundedUp(std::size_t size, std::size_t alignment) {
+  return (size + alignment - 1) / alignment * alignment;
+}
+
+// Whether the members follow one another in memory with nothing but their alignment between them,
+// the first right behind the pointer to the table of virtual operations, and nothing follows the
+// last. An heir's own members follow those of its base.
 template <typename Class, typename Members>
 bool StandInThisOrder(const Class& object, const Members& members) {
-  const std::vector<std::ptrdiff_t> offsets = Offsets(object, members);
-  for (std::size_t i = 1; i < offsets.size(); ++i) {
-    if (offsets[i - 1] >= offsets[i]) {
-      return false;
-    }
-  }
-  return offsets.at(0) == static_cast<std::ptrdiff_t>(sizeof(void*));
+  std::size_t end = sizeof(void*);
+  const auto follows = [&](auto member) {
+    using Type = std::remove_cv_t<std::remove_reference_t<decltype(object.*member)>>;
+    const auto offset = static_cast<std::size_t>(Offsets(object, std::tuple(member)).front());
+    const bool right_behind = offset == RoundedUp(end, alignof(Type));
+    end = offset + sizeof(Type);
+    return right_behind;
+  };
+  const bool in_order =
+      std::apply([&](auto... member) { return (follows(member) && ...); }, members);
+  return in_order && sizeof(Class) == RoundedUp(end, alignof(Class));
 }
 
 // Below is how x86 code finds virtual operations, 32 and 64 bits wide.

@@ -185,6 +185,12 @@ TEST(TextToJson, BlanksAndCommentsAreSkipped) {
   EXPECT_EQ(value["a"].asInt(), 1);
 }
 
+TEST(TextToJson, CommentsAreKeptWithTheirValues) {
+  Json::Value value;
+  ASSERT_TRUE(TextToJson("{\"a\": /* x */ 1}", value));
+  EXPECT_EQ(value["a"].getComment(Json::commentBefore), "/* x */");
+}
+
 // The innermost value counts: so many values may be open in one another.
 TEST(TextToJson, AsManyValuesInOneAnotherAsTheBoundAreRead) {
   EXPECT_TRUE(Parses(Arrays(kDeepestJson, "")));

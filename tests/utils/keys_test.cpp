@@ -3,7 +3,9 @@
 #include <gtest/gtest.h>
 #include <tuvosharing/keys.h>
 
+#include <cstdint>
 #include <cstring>
+#include <iterator>
 #include <map>
 #include <string>
 #include <type_traits>
@@ -19,14 +21,14 @@ struct Key {
 };
 
 // Takes nothing but a variable of exactly this type.
-const char* const* Variable(const char*& variable) {
+constexpr const char* const* Variable(const char*& variable) {
   return &variable;
 }
 
 #define KEY(name, text) \
   { #name, Variable(TUVO::sharing::name), text }
 
-const Key kKeys[] = {
+constexpr Key kKeys[] = {
     KEY(SZK_UID_, "uid"),
     KEY(SZK_SESSION_ID_, "session_id"),
     KEY(SZK_TIMEOUT, "timeout"),
@@ -113,7 +115,7 @@ TEST(Keys, LimitsHaveTheirValuesAndAreConstant32BitIntegers) {
 TEST(Keys, ExactlyTwoTextsAreSharedByTwoConstantsEach) {
   std::map<std::string, int> uses;
   for (const Key& key : kKeys) {
-    ++uses[key.text];
+    ++uses[*key.variable];
   }
   std::map<std::string, int> shared;
   for (const auto& [text, count] : uses) {
@@ -129,11 +131,31 @@ TEST(Keys, SharedTextsCompareEqual) {
   EXPECT_EQ(std::strcmp(SZK_PROTECT_PROTECT_NONE, SZK_REDIRECT_REDIRECT_NONE), 0);
 }
 
-// Taken before main, by an object of this program.
-const std::string kSeenBeforeMain = std::string(SZK_HASH) + "/" + SZF_SHARING_DB_PATH;
+// What the constants hold when this is made.
+struct Copies {
+  Copies()
+      : limits{SHARING_HASH_LENGTH, SHARING_SESSION_LENGTH, SHARING_MAX_RETRY_TIMES,
+               SHARING_PASS_HASH_LENGTH} {
+    for (std::size_t i = 0; i < std::size(kKeys); ++i) {
+      texts[i] = *kKeys[i].variable;
+    }
+  }
+
+  const char* texts[std::size(kKeys)];
+  std::int32_t limits[4];
+};
+
+// Before every other object of the program, those of the library included.
+__attribute__((init_priority(101))) const Copies kFirst;
 
 TEST(Keys, AreReadyBeforeAnyCodeOfTheProgramRuns) {
-  EXPECT_EQ(kSeenBeforeMain, "hash//usr/tuvo/etc/private/session/sharing.db");
+  for (std::size_t i = 0; i < std::size(kKeys); ++i) {
+    EXPECT_STREQ(kFirst.texts[i], kKeys[i].text) << kKeys[i].name;
+  }
+  EXPECT_EQ(kFirst.limits[0], 9);
+  EXPECT_EQ(kFirst.limits[1], 32);
+  EXPECT_EQ(kFirst.limits[2], 50);
+  EXPECT_EQ(kFirst.limits[3], 6);
 }
 
 }  // namespace

@@ -17,12 +17,14 @@
 namespace {
 
 std::string failing;             // the one function that fails
+int failure = 0;                 // what it answers
 unsigned int other_length = 0;   // when set, the length that libgcrypt tells of its digest
 std::vector<std::string> calls;  // what was called, in order
+void* room = nullptr;            // the last that was taken for a text, until it is freed
 
 int Answer(const char* name) {
   calls.emplace_back(name);
-  return failing == name ? 0 : 1;
+  return failing == name ? failure : 1;
 }
 
 template <typename Function>
@@ -35,17 +37,18 @@ Function Real(const char* name) {
 extern "C" {
 
 int MD5_Init(MD5_CTX* context) {
-  return Answer("MD5_Init") == 1 ? Real<decltype(&MD5_Init)>("MD5_Init")(context) : 0;
+  const int answer = Answer("MD5_Init");
+  return answer == 1 ? Real<decltype(&MD5_Init)>("MD5_Init")(context) : answer;
 }
 
 int MD5_Update(MD5_CTX* context, const void* data, size_t length) {
-  return Answer("MD5_Update") == 1
-             ? Real<decltype(&MD5_Update)>("MD5_Update")(context, data, length)
-             : 0;
+  const int answer = Answer("MD5_Update");
+  return answer == 1 ? Real<decltype(&MD5_Update)>("MD5_Update")(context, data, length) : answer;
 }
 
 int MD5_Final(unsigned char* digest, MD5_CTX* context) {
-  return Answer("MD5_Final") == 1 ? Real<decltype(&MD5_Final)>("MD5_Final")(digest, context) : 0;
+  const int answer = Answer("MD5_Final");
+  return answer == 1 ? Real<decltype(&MD5_Final)>("MD5_Final")(digest, context) : answer;
 }
 
 gcry_error_t gcry_control(enum gcry_ctl_cmds command, ...) {
@@ -80,10 +83,22 @@ void* operator new[](std::size_t size, const std::nothrow_t& /*tag*/) noexcept {
     return nullptr;
   }
   try {
-    return ::operator new[](size);
+    room = ::operator new[](size);
+    return room;
   } catch (const std::bad_alloc&) {
     return nullptr;
   }
+}
+
+void operator delete[](void* memory) noexcept {
+  if (memory == room) {
+    room = nullptr;
+  }
+  Real<void (*)(void*)>("_ZdaPv")(memory);
+}
+
+void operator delete[](void* memory, std::size_t /*size*/) noexcept {
+  ::operator delete[](memory);
 }
 
 namespace {
@@ -99,6 +114,7 @@ class PasswordHashFailure : public testing::Test {
 
   static void Reset(const std::string& name) {
     failing = name;
+    failure = 0;
     other_length = 0;
     calls.clear();
   }
@@ -106,11 +122,14 @@ class PasswordHashFailure : public testing::Test {
 
 TEST_F(PasswordHashFailure, EachFailingStepOfMd5FailsTheDigestAndLeavesTheOutputAlone) {
   for (const char* step : {"MD5_Init", "MD5_Update", "MD5_Final"}) {
-    Reset(step);
-    std::string out = "kept";
-    EXPECT_FALSE(MD5HashPassword("abc", out)) << step;
-    EXPECT_EQ(out, "kept") << step;
-    EXPECT_EQ(calls.back(), step);
+    for (const int answer : {0, -1}) {
+      Reset(step);
+      failure = answer;
+      std::string out = "kept";
+      EXPECT_FALSE(MD5HashPassword("abc", out)) << step << " " << answer;
+      EXPECT_EQ(out, "kept") << step;
+      EXPECT_EQ(calls.back(), step);
+    }
   }
 }
 
@@ -135,6 +154,13 @@ TEST_F(PasswordHashFailure, Sha1MakesLibgcryptReadyBeforeEveryDigestThatItMakesI
     EXPECT_TRUE(Sha1WithSaltHashPassword("ab", "c", out));
     EXPECT_EQ(calls, once);
   }
+}
+
+TEST_F(PasswordHashFailure, TheRoomForSha1sTextIsFreed) {
+  std::string out;
+  EXPECT_TRUE(Sha1WithSaltHashPassword("ab", "c", out));
+  EXPECT_EQ(calls.back(), "room for 41");
+  EXPECT_EQ(room, nullptr);
 }
 
 TEST_F(PasswordHashFailure, Sha1WithoutMemoryFailsAndLeavesTheOutputAlone) {

@@ -4,6 +4,8 @@
 #include <tuvoplatform/random.h>
 #include <tuvosharing/utils.h>
 
+#include <functional>
+#include <thread>
 #include <utility>
 #include <vector>
 
@@ -11,11 +13,13 @@ namespace {
 
 int fall = 0;                            // what the dice show
 std::vector<std::pair<int, int>> asked;  // the ranges that were asked for
+std::vector<const void*> dice;           // that were thrown
 
 }  // namespace
 
 int TUVO::RANDOM::TUVORandomBase::random(int low, int high) {
   asked.emplace_back(low, high);
+  dice.push_back(this);
   return fall;
 }
 
@@ -41,6 +45,19 @@ TEST(ProbabilityThreshold, OneThrowFrom0To99IsMadeForEachQuestion) {
     IsProbabilityHit(probability);
   }
   EXPECT_EQ(asked, (std::vector<std::pair<int, int>>(5, {0, 99})));
+}
+
+TEST(ProbabilityThreshold, TheSameDiceAreThrownForEveryQuestion) {
+  // At another place of the stack, were they kept there.
+  const std::function<void(int)> ask_deeper = [&](int depth) {
+    depth > 0 ? ask_deeper(depth - 1) : static_cast<void>(IsProbabilityHit(0.5F));
+  };
+  dice.clear();
+  ask_deeper(0);
+  ask_deeper(50);
+  std::thread(ask_deeper, 0).join();
+  ASSERT_EQ(dice.size(), 3U);
+  EXPECT_EQ(dice, std::vector<const void*>(3, dice[0]));
 }
 
 TEST(ProbabilityThreshold, WholePerCentsBelowTheProbabilityHit) {

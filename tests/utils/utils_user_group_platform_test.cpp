@@ -35,6 +35,7 @@ struct Platform {
   std::vector<std::string> groups;
   std::optional<int> groups_count;  // when set, the count that the list tells
   std::map<std::string, unsigned int> gids;
+  int group_failure = 2;           // the answer for a group that is not there
   std::vector<std::string> asked;  // names asked for, in order
   int records = 0;                 // handed out and not freed
   int lists = 0;
@@ -103,7 +104,7 @@ int TUVOGroupGetGID(const char* name, unsigned int* gid) {
   const auto found = platform.gids.find(name);
   if (found == platform.gids.end()) {
     *gid = 12345;  // what a failure leaves there is not to be believed
-    return 2;
+    return platform.group_failure;
   }
   *gid = found->second;
   return 0;
@@ -263,13 +264,16 @@ TEST_F(UserGroupPlatform, EveryAnswerButZeroIsNoUid) {
 
 TEST_F(UserGroupPlatform, ARecordThatComesWithAFailureIsFreedAndNotUsed) {
   platform.record_on_failure = true;
-  unsigned int uid = 77;
-  std::string name = "kept";
-  EXPECT_FALSE(UserToUID("mallory", uid));
-  EXPECT_FALSE(UIDToUser(9999, name));
-  EXPECT_FALSE(GIDToGroup(9999, name));
-  EXPECT_EQ(uid, 77U);
-  EXPECT_EQ(name, "kept");
+  for (const int answer : {-1, 1, -2, 22}) {
+    platform.failure = answer;
+    unsigned int uid = 77;
+    std::string name = "kept";
+    EXPECT_FALSE(UserToUID("mallory", uid)) << answer;
+    EXPECT_FALSE(UIDToUser(9999, name)) << answer;
+    EXPECT_FALSE(GIDToGroup(9999, name)) << answer;
+    EXPECT_EQ(uid, 77U);
+    EXPECT_EQ(name, "kept");
+  }
 }
 
 TEST_F(UserGroupPlatform, ASuccessWithoutARecordIsNone) {
@@ -313,8 +317,11 @@ TEST_F(UserGroupPlatform, GroupNamesAreNotConverted) {
 }
 
 TEST_F(UserGroupPlatform, EveryAnswerButZeroIsNoGid) {
-  unsigned int gid = 0;
-  EXPECT_FALSE(GroupToGID("four", gid));
+  for (const int answer : {-1, 1, 2}) {
+    platform.group_failure = answer;
+    unsigned int gid = 0;
+    EXPECT_FALSE(GroupToGID("four", gid)) << answer;
+  }
 }
 
 TEST_F(UserGroupPlatform, TheGroupsAreAskedForByNameOfAllSources) {
@@ -324,10 +331,14 @@ TEST_F(UserGroupPlatform, TheGroupsAreAskedForByNameOfAllSources) {
 }
 
 TEST_F(UserGroupPlatform, EmptyAndUnknownGroupsAreSkippedAndRepeatedOnesCountOnce) {
-  Gids gids{99};
-  EXPECT_TRUE(Groups({"three", "", "four", "one", "three"}, gids));
-  EXPECT_EQ(gids, (Gids{11, 13, 99}));
-  EXPECT_EQ(platform.asked, (Texts{"alice/1/0", "three", "four", "one", "three"}));
+  for (const int answer : {-1, 1, 2}) {
+    platform.group_failure = answer;
+    platform.asked.clear();
+    Gids gids{99};
+    EXPECT_TRUE(Groups({"three", "", "four", "one", "three"}, gids)) << answer;
+    EXPECT_EQ(gids, (Gids{11, 13, 99})) << answer;
+    EXPECT_EQ(platform.asked, (Texts{"alice/1/0", "three", "four", "one", "three"}));
+  }
 }
 
 TEST_F(UserGroupPlatform, AnAccountInNoGroupYieldsNothing) {
