@@ -1,5 +1,6 @@
 // The database's operations from each identity that a program may start under: what it can do
 // there, what is logged where it cannot, and that the process is afterwards what it was before.
+#include <dlfcn.h>
 #include <grp.h>
 #include <gtest/gtest.h>
 #include <internal/sharing_db_private.h>
@@ -9,6 +10,7 @@
 
 #include <cerrno>
 #include <cstdio>
+#include <filesystem>
 #include <functional>
 #include <iterator>
 #include <memory>
@@ -538,16 +540,33 @@ INSTANTIATE_TEST_SUITE_P(By, UnderTheSystemIdentity,
                                          NamedOperation{"Closing", Close}),
                          [](const auto& operation) { return operation.param.name; });
 
+constexpr char kWholeRun[] = "/tmp/whole run/whole_run";
+
+// Puts whole_run, and the library that it loads, where everybody may start it: the build folder may
+// stand in one that only its owner may search.
+void InstallWholeRun() {
+  Dl_info platform{};
+  if (dladdr(dlsym(RTLD_DEFAULT, "TUVODBConnect"), &platform) == 0) {
+    throw std::runtime_error("the platform's library is nowhere");
+  }
+  const std::string library = "/tmp/whole run/libtuvoplatform.so.1";
+  std::filesystem::create_directory("/tmp/whole run");
+  const auto replace = std::filesystem::copy_options::overwrite_existing;
+  std::filesystem::copy_file(TUVO_WHOLE_RUN, kWholeRun, replace);
+  std::filesystem::copy_file(platform.dli_fname, library, replace);
+}
+
 // The id-changing calls of whole_run, from its first instruction to its last, as strace lists them.
 // Throws when it does not run.
 std::string IdChangesOfAWholeRun(const Ids& ids) {
+  InstallWholeRun();
   const std::string list = NewPath("/tmp/id changes " + std::to_string(ids.euid));
   const int status = RunInChild([&] {
     Take(ids);
     execlp("strace", "strace", "-f", "-qq", "-e", "signal=none", "-e",
            "trace=/^set(re|res|fs)?[ug]id(32)?$,/^setgroups(32)?$", "-E",
            "ASAN_OPTIONS=detect_leaks=0",  // nobody is traced by two
-           "-o", list.c_str(), TUVO_WHOLE_RUN, nullptr);
+           "-E", "LD_LIBRARY_PATH=/tmp/whole run", "-o", list.c_str(), kWholeRun, nullptr);
     return 1;
   });
   if (status != 0) {
