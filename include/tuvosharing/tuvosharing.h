@@ -14,9 +14,11 @@
 #include <tuvosharing/object_db.h>
 #include <tuvosharing/result.h>
 #include <tuvosharing/row.h>
+#include <tuvosharing/send_webapi.h>
 #include <tuvosharing/session.h>
 #include <tuvosharing/session_db.h>
 #include <tuvosharing/sharing_db.h>
+#include <tuvosharing/sharing_url.h>
 #include <tuvosharing/token.h>
 #include <tuvosharing/token_db.h>
 #include <tuvosharing/user_group.h>
