@@ -2,13 +2,16 @@
 #include <tuvoplatform/cgi.h>
 #include <unistd.h>
 
+#include <array>
 #include <cerrno>
 #include <cstdlib>
 #include <cstring>
 #include <exception>
+#include <new>
 #include <optional>
 #include <string>
 #include <string_view>
+#include <vector>
 
 #include "cgi_request.h"
 #include "client_address.h"
@@ -27,7 +30,7 @@ std::optional<std::string_view> RealEnvironment(const char* name) {
   return value == nullptr ? std::nullopt : std::optional<std::string_view>(value);
 }
 
-size_t ReadStandardInput(char* data, size_t length) {
+size_t ReadStandardInput(void* /*context*/, char* data, size_t length) {
   ssize_t count = 0;
   do {
     count = read(STDIN_FILENO, data, length);
@@ -35,27 +38,55 @@ size_t ReadStandardInput(char* data, size_t length) {
   return count < 0 ? 0 : static_cast<size_t>(count);
 }
 
-// A failure is as final as a success: the body can be read only once.
-std::optional<CgiRequest> ReadRequest() {
+// What the process knows of the request it serves.
+struct Turn {
+  TuvoCgiBodyReader read = ReadStandardInput;
+  void* context = nullptr;
+  bool was_read = false;
+  std::optional<CgiRequest> request;  // nothing when it was refused
+  // The process's and not a context's: a library may set a cookie in a context of its own, which is
+  // gone by the time the program sends its headers.
+  CookieQueue queue;
+};
+
+// Never destroyed: other objects' destructors may still look at its texts. Made without the heap,
+// so that it is always there.
+Turn& TheTurn() {
+  alignas(Turn) static std::array<unsigned char, sizeof(Turn)> place;
+  static Turn& turn = *new (place.data()) Turn;
+  return turn;
+}
+
+std::optional<CgiRequest> ReadRequest(const Turn& turn) {
   try {
-    return tuvo_platform::ParseCgiRequest(RealEnvironment, ReadStandardInput);
+    return tuvo_platform::ParseCgiRequest(RealEnvironment, [&turn](char* data, size_t length) {
+      return turn.read(turn.context, data, length);
+    });
   } catch (const std::exception&) {
     return std::nullopt;
   }
 }
 
-// This process's request, nothing when it was refused. Never destroyed: its texts are promised
-// until the process ends, and other objects' destructors may still look at them.
+// A failure is as final as a success: the body can be read only once.
 std::optional<CgiRequest>& TheRequest() {
-  static auto& request = *new std::optional<CgiRequest>(ReadRequest());
-  return request;
+  Turn& turn = TheTurn();
+  if (!turn.was_read) {
+    turn.was_read = true;
+    turn.request = ReadRequest(turn);
+  }
+  return turn.request;
 }
 
-// The process's queue and not a context's: a library may set a cookie in a context of its own,
-// which is gone by the time the program sends its headers.
 CookieQueue& TheQueue() {
-  static auto& queue = *new CookieQueue;
-  return queue;
+  return TheTurn().queue;
+}
+
+// Passwords and session identifiers of one visitor have no business in the memory that the next
+// one's request is read into.
+void Overwrite(std::vector<tuvo_platform::CgiField>* fields) {
+  for (tuvo_platform::CgiField& field : *fields) {
+    explicit_bzero(field.second.data(), field.second.size());
+  }
 }
 
 const CgiRequest* RequestOf(const TUVOCGI* cgi) {
@@ -64,22 +95,31 @@ const CgiRequest* RequestOf(const TUVOCGI* cgi) {
 
 }  // namespace
 
+void TuvoCgiNextRequest(TuvoCgiBodyReader read, void* context) {
+  Turn& turn = TheTurn();
+  if (turn.request) {
+    Overwrite(&turn.request->fields);
+    Overwrite(&turn.request->cookies);
+  }
+  turn.request.reset();
+  turn.queue = CookieQueue();
+  turn.was_read = false;
+  turn.read = read == nullptr ? ReadStandardInput : read;
+  turn.context = context;
+}
+
 int TuvoCgiInit(const char* /*name*/, TUVOCGI* cgi) {
   if (cgi == nullptr) {
     return kFailure;
   }
   *cgi = TUVOCGI{};
-  try {
-    // cppcheck-suppress constVariable  ; its address goes where no const pointer does
-    std::optional<CgiRequest>& request = TheRequest();
-    if (!request) {
-      return kFailure;
-    }
-    cgi->request = &*request;
-    return kSuccess;
-  } catch (const std::exception&) {
+  // cppcheck-suppress constVariable  ; its address goes where no const pointer does
+  std::optional<CgiRequest>& request = TheRequest();
+  if (!request) {
     return kFailure;
   }
+  cgi->request = &*request;
+  return kSuccess;
 }
 
 int TuvoCgiLoadInCookies(TUVOCGI* cgi) {

@@ -7,26 +7,14 @@
 #include <new>
 #include <string>
 
+#include "database_connection.h"
 #include "database_result.h"
 #include "database_statement.h"
 
 namespace {
 
-// What a TUVODB handle really is.
-struct Connection : TUVODB_tag {
-  // cppcheck-suppress uninitDerivedMemberVar  ; {} leaves no member out
-  Connection() : TUVODB_tag{} {}
-  // close_v2: a statement that the caller prepared on `sqlite` may still be there; the connection
-  // then ends with it instead of staying open for good.
-  ~Connection() { sqlite3_close_v2(sqlite); }
-  Connection(const Connection&) = delete;
-  Connection& operator=(const Connection&) = delete;
-
-  std::string error;
-};
-
-// Short enough to need no memory of its own in a std::string.
-constexpr char kNoMemory[] = "out of memory";
+using tuvo_platform::Connection;
+using tuvo_platform::kNoMemory;
 
 // Runs all statements of `sql`. On a failure its text is in `connection->error`.
 bool RunAll(Connection* connection, const char* sql, std::unique_ptr<DBResult_tag>* rows) {

@@ -274,6 +274,157 @@ TEST(Cgi, EveryLackOfMemoryIsAFailureAndNoException) {
   EXPECT_GT(failing, 20);
 }
 
+// A body in memory, and how often somebody asked for a piece of it.
+struct Body {
+  std::string left;
+  int calls = 0;
+
+  static size_t Read(void* context, char* data, size_t length) {
+    auto* body = static_cast<Body*>(context);
+    ++body->calls;
+    const size_t count = body->left.copy(data, length);
+    body->left.erase(0, count);
+    return count;
+  }
+};
+
+// Begins the next request of this process.
+void Next(const Environment& environment, Body* body) {
+  clearenv();
+  for (const auto& [name, value] : environment) {
+    setenv(name.c_str(), value.c_str(), 1);
+  }
+  TuvoCgiNextRequest(body == nullptr ? nullptr : Body::Read, body);
+}
+
+TEST(Cgi, NextRequestIsParsedFromTheEnvironmentOfThen) {
+  EXPECT_EQ(Serve(Get("a=1&b=1"), "",
+                  [] {
+                    {
+                      Context context;
+                      ASSERT_STREQ(TuvoCgiGetRequestParam(&context.cgi, "a"), "1");
+                    }
+                    Environment next = Get("a=2");
+                    next["HTTP_COOKIE"] = "id=2";
+                    Next(next, nullptr);
+                    {
+                      Context context;
+                      ASSERT_EQ(TuvoCgiLoadInCookies(&context.cgi), 1);
+                      EXPECT_STREQ(TuvoCgiGetRequestParam(&context.cgi, "a"), "2");
+                      EXPECT_EQ(TuvoCgiGetRequestParam(&context.cgi, "b"), nullptr);
+                      EXPECT_STREQ(TuvoCgiGetCookie(&context.cgi, "id"), "2");
+                    }
+                    Next(Get(""), nullptr);
+                    Context context;
+                    ASSERT_EQ(TuvoCgiLoadInCookies(&context.cgi), 1);
+                    EXPECT_EQ(TuvoCgiGetRequestParam(&context.cgi, "a"), nullptr);
+                    EXPECT_EQ(TuvoCgiGetCookie(&context.cgi, "id"), nullptr);
+                  }),
+            0);
+}
+
+TEST(Cgi, NextRequestsBodyComesFromItsReader) {
+  EXPECT_EQ(Serve(Get(""), "a=input",
+                  [] {
+                    Body first{"a=1&b=1", 0};
+                    Next(Post("", 7), &first);
+                    {
+                      Context context;
+                      EXPECT_STREQ(TuvoCgiGetRequestParam(&context.cgi, "a"), "1");
+                    }
+                    Body second{"a=22", 0};
+                    Next(Post("", 4), &second);
+                    {
+                      Context context;
+                      EXPECT_STREQ(TuvoCgiGetRequestParam(&context.cgi, "a"), "22");
+                      EXPECT_EQ(TuvoCgiGetRequestParam(&context.cgi, "b"), nullptr);
+                    }
+                    Next(Post("", 7), nullptr);
+                    Context context;
+                    EXPECT_STREQ(TuvoCgiGetRequestParam(&context.cgi, "a"), "input");
+                  }),
+            0);
+}
+
+TEST(Cgi, ReaderIsAskedOnceARequestIsParsedAndNeverAgain) {
+  EXPECT_EQ(Serve(Get(""), "",
+                  [] {
+                    Body body{"a=1", 0};
+                    Next(Post("", 3), &body);
+                    EXPECT_EQ(body.calls, 0);
+                    { Context context; }
+                    EXPECT_EQ(body.calls, 1);
+                    Context again;
+                    TuvoCgiGetRequestParam(&again.cgi, "x");
+                    EXPECT_EQ(body.calls, 1);
+                  }),
+            0);
+}
+
+TEST(Cgi, ReaderThatEndsEarlyRefusesItsRequestAlone) {
+  EXPECT_EQ(Serve(Get(""), "",
+                  [] {
+                    Body cut{"a=1", 0};
+                    Next(Post("", 5), &cut);
+                    { EXPECT_NE(Context().status, 1); }
+                    Body whole{"a=1&b", 0};
+                    Next(Post("", 5), &whole);
+                    Context context;
+                    ASSERT_EQ(context.status, 1);
+                    EXPECT_STREQ(TuvoCgiGetRequestParam(&context.cgi, "a"), "1");
+                  }),
+            0);
+}
+
+TEST(Cgi, NextRequestHasNoCookieOfTheFormer) {
+  EXPECT_EQ(Serve(Get(""), "",
+                  [] {
+                    {
+                      Context context;
+                      ASSERT_EQ(TuvoCgiSetCookies(&context.cgi, "id", "secret", "/"), 1);
+                    }
+                    Next(Get(""), nullptr);
+                    Context context;
+                    EXPECT_EQ(WrittenCookies(&context.cgi), "");
+                  }),
+            0);
+}
+
+TEST(Cgi, NextRequestSaysAnewWhetherItCameOverHttps) {
+  EXPECT_EQ(Serve({{"REQUEST_METHOD", "GET"}, {"HTTPS", "on"}}, "",
+                  [] {
+                    { ASSERT_EQ(Context().status, 1); }
+                    Next(Get(""), nullptr);
+                    Context context;
+                    ASSERT_EQ(TuvoCgiSetCookies(&context.cgi, "id", "abc", "/"), 1);
+                    EXPECT_EQ(WrittenCookies(&context.cgi),
+                              "Set-Cookie: id=abc; Path=/; HttpOnly; SameSite=Lax\r\n");
+                  }),
+            0);
+}
+
+// The heap gives the memory out again as it is: what is looked at is where the text was.
+TEST(Cgi, TextsOfTheFormerRequestAreOverwritten) {
+  EXPECT_EQ(Serve(Get(""), "",
+                  [] {
+                    const std::string secret(4000, 's');
+                    Body body{"password=" + secret, 0};
+                    Next(Post("", 9 + secret.size()), &body);
+                    const char* text = nullptr;
+                    {
+                      Context context;
+                      text = TuvoCgiGetRequestParam(&context.cgi, "password");
+                    }
+                    ASSERT_EQ(text, secret);
+                    tuvo_test::watched = text;
+                    tuvo_test::watched_size = secret.size();
+                    TuvoCgiNextRequest(nullptr, nullptr);
+                    EXPECT_TRUE(tuvo_test::watched_was_freed);
+                    EXPECT_TRUE(tuvo_test::watched_was_zero);
+                  }),
+            0);
+}
+
 // What TuvoCgiGetRemoteIP writes with these variables set; "(none)" for a failure.
 std::string RemoteIp(const Environment& environment, unsigned int size = 65) {
   std::string result;

@@ -1,8 +1,10 @@
-// Makes single allocations of C++ fail, in this program and in the library that it tests. It
-// replaces the operators of the whole program: to be included by one of its files.
+// Makes single allocations of C++ fail, in this program and in the library that it tests, and tells
+// what one held when it was freed. It replaces the operators of the whole program: to be included
+// by one of its files.
 #ifndef TESTS_PLATFORM_FAILING_ALLOCATIONS_H_
 #define TESTS_PLATFORM_FAILING_ALLOCATIONS_H_
 
+#include <algorithm>
 #include <cstdlib>
 #include <new>
 
@@ -16,6 +18,23 @@ inline void* Allocate(std::size_t size) {
     return nullptr;
   }
   return std::malloc(size == 0 ? 1 : size);
+}
+
+// A piece of memory to be looked at when it is freed (only its beginning is known by its address),
+// and what was seen.
+inline const char* watched = nullptr;
+inline std::size_t watched_size = 0;
+inline bool watched_was_freed = false;
+inline bool watched_was_zero = false;
+
+inline void Free(void* memory) {
+  if (memory != nullptr && memory == watched) {
+    watched_was_freed = true;
+    watched_was_zero =
+        std::all_of(watched, watched + watched_size, [](char c) { return c == '\0'; });
+    watched = nullptr;
+  }
+  std::free(memory);
 }
 
 }  // namespace tuvo_test
@@ -34,13 +53,13 @@ NOT_INLINED void* operator new(std::size_t size, const std::nothrow_t& /*nothrow
   return tuvo_test::Allocate(size);
 }
 NOT_INLINED void operator delete(void* memory) noexcept {
-  std::free(memory);
+  tuvo_test::Free(memory);
 }
 NOT_INLINED void operator delete(void* memory, std::size_t /*size*/) noexcept {
-  std::free(memory);
+  tuvo_test::Free(memory);
 }
 NOT_INLINED void operator delete(void* memory, const std::nothrow_t& /*nothrow*/) noexcept {
-  std::free(memory);
+  tuvo_test::Free(memory);
 }
 
 #undef NOT_INLINED

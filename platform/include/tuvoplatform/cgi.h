@@ -1,7 +1,8 @@
 // The platform's CGI interface: the request that this process serves, and the account login.
 //
-// The request is read and parsed once per process, by whichever call comes first; all contexts look
-// at the same request. Sizes are limited (docs/platform-cgi.md); a request over a limit, or one
+// The request is read and parsed once, by whichever TuvoCgiInit comes first; all contexts look at
+// the same request. A process that serves several, one after another, says where each begins
+// (TuvoCgiNextRequest). Sizes are limited (docs/platform-cgi.md); a request over a limit, or one
 // that does not parse, makes TuvoCgiInit fail in every context. Without REQUEST_METHOD in the
 // environment there is no web server: the request is then an empty one.
 //
@@ -9,6 +10,7 @@
 #ifndef TUVOPLATFORM_CGI_H_
 #define TUVOPLATFORM_CGI_H_
 
+#include <stddef.h>
 #include <stdio.h>
 #include <tuvoplatform/export.h>
 
@@ -31,6 +33,17 @@ typedef struct LoginInfo_tag {
   int nFlag;             // 1: no session of the appliance's own; not looked at on plain Linux
 } LoginInfo;
 
+// Stores up to `length` further bytes of a request's body in `data` and returns how many; 0 at the
+// body's end and on an error.
+typedef size_t (*TuvoCgiBodyReader)(void* context, char* data, size_t length);
+
+// Begins the next request of a process that serves one after another: forgets the parsed request,
+// whose texts are overwritten, and every queued cookie. The next TuvoCgiInit parses the environment
+// as it is then, and takes the body from `read`, which gets `context` (null: from standard input);
+// nothing else ever calls `read`. Texts and contexts of the former request must no longer be used:
+// free the contexts before. Without a call the process's request is that of its start.
+TUVOPLATFORM_API void TuvoCgiNextRequest(TuvoCgiBodyReader read, void* context);
+
 // Makes `*cgi` a context of this process's request. `name` is not looked at; pass "".
 // Returns 1; another value when the request could not be read, `*cgi` is then fit for TuvoCgiFree
 // only.
@@ -42,16 +55,16 @@ TUVOPLATFORM_API int TuvoCgiLoadInCookies(TUVOCGI* cgi);
 
 // The value of a request parameter: of the body's fields (url-encoded or multipart, without
 // files) first, then of the query string's; the first of several. Names are compared exactly, case
-// included. Null when there is none. Owned by the platform, valid until the process ends.
+// included. Null when there is none. Owned by the platform, valid until the next request begins.
 TUVOPLATFORM_API const char* TuvoCgiGetRequestParam(const TUVOCGI* cgi, const char* name);
 
 // The value of a cookie, the first of several; null when there is none or the cookies were not
-// loaded. Owned by the platform, valid until the process ends.
+// loaded. Owned by the platform, valid until the next request begins.
 TUVOPLATFORM_API const char* TuvoCgiGetCookie(const TUVOCGI* cgi, const char* name);
 
 // Queues the line "Set-Cookie: name=value; Path=path; HttpOnly; SameSite=Lax", with "; Secure"
 // under HTTPS, for the program to send (TuvoCgiWriteCookies); a queued cookie of the same name and
-// path is replaced. The queue is the process's: it outlives this context. Returns 1; another value,
+// path is replaced. The queue is the request's: it outlives this context. Returns 1; another value,
 // with the queue unchanged, when a text is null or holds a character that a cookie cannot (name: an
 // RFC 6265 token; value: RFC 6265 cookie octets, or empty; path: begins with '/', printable ASCII
 // and blanks without ';').

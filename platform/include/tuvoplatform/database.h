@@ -67,6 +67,20 @@ TUVOPLATFORM_API void TUVODBFreeResult(struct DBResult_tag* result);
 TUVOPLATFORM_API int TUVODBEscapeStringEX2(TUVODB* db, char* out, unsigned int size,
                                            const char* text, unsigned int length);
 
+// Told between the steps of a copy: `left` of `total` pages are still to be copied. Another answer
+// than 0 ends the copying.
+typedef int (*TUVODBBackupProgress)(void* context, unsigned int left, unsigned int total);
+
+// Copies the whole database behind `from` to the new file `to`, as it is at one moment: other
+// connections may go on writing where the journal mode lets them beside a reader (WAL). Nothing may
+// exist at `to` before; the file gets the mode 0600 (less what the umask takes) and belongs to the
+// effective identity. It is complete by itself, without companions, and has the journal mode of
+// `from`. `progress` may be null. No transaction may be open on `from`.
+// Returns 0, or -1 with the reason in TUVODBErrorGet(from); `to` is then not there, or is what was
+// there before.
+TUVOPLATFORM_API int TUVODBBackup(TUVODB* from, const char* to, TUVODBBackupProgress progress,
+                                  void* context);
+
 // Closes the connection and frees the handle; an open transaction is rolled back. Null is accepted.
 TUVOPLATFORM_API void TUVODBClose(TUVODB* db);
 
