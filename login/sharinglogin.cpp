@@ -11,6 +11,7 @@
 #include <ctime>
 #include <exception>
 #include <limits>
+#include <utility>
 
 namespace TUVO {
 
@@ -282,18 +283,54 @@ bool Logout(const std::string& hash, const std::string& session_id) {
   return tokens.Delete(token);
 }
 
-bool IncreaseUseCount(const std::string& hash) {
-  SharingDB& db = SharingDB::Instance();
-  if (!db.IsGood()) {
-    return false;
+// Holds the file for writing until it is committed or taken back. Within a transaction of the
+// caller's own this is none, and that one decides.
+class WriteTransaction {
+ public:
+  explicit WriteTransaction(SharingDB& db)
+      : db_(db), open_(db.Execute("BEGIN IMMEDIATE")), begun_(open_ || IsWithinAnother()) {}
+  ~WriteTransaction() {
+    if (open_) {
+      db_.Execute("ROLLBACK");
+    }
   }
-  EntryDB entries(db);
+  WriteTransaction(const WriteTransaction&) = delete;
+  WriteTransaction& operator=(const WriteTransaction&) = delete;
+
+  // False when the file could not be had, being locked by somebody else for one.
+  bool HasBegun() const { return begun_; }
+  bool Commit() { return !std::exchange(open_, false) || db_.Commit(); }
+
+ private:
+  // What SQLite says to a second BEGIN.
+  bool IsWithinAnother() const {
+    return db_.GetLastError().find("within a transaction") != std::string::npos;
+  }
+
+  SharingDB& db_;
+  bool open_;
+  bool begun_;
+};
+
+bool CountUse(EntryDB& entries, const std::string& hash) {
   Entry entry;
   if (!entries.GetByHash(hash, entry)) {
     return false;
   }
   entry.inc_use_count();
   return entries.Update(entry);
+}
+
+bool IncreaseUseCount(const std::string& hash) {
+  SharingDB& db = SharingDB::Instance();
+  if (!db.IsGood()) {
+    return false;
+  }
+  EntryDB entries(db);  // checkpoints when the transaction is over
+  // The whole link is read and written back: what its owner, or another login, writes in between
+  // would be undone, a link that was just switched off would be on again.
+  WriteTransaction transaction(db);
+  return transaction.HasBegun() && CountUse(entries, hash) && transaction.Commit();
 }
 
 // What may still be thrown, for want of memory, ends here: a caller in C could not catch it.

@@ -1,4 +1,13 @@
 // The end of a visitor's access to a link, and the counting of a link's uses.
+#include <sys/wait.h>
+#include <tuvosharing/keys.h>
+#include <tuvosharing/sharing_db.h>
+#include <unistd.h>
+
+#include <chrono>
+#include <thread>
+
+#include "db/sqlite_file.h"
 #include "login/visit.h"
 
 namespace tuvo_test {
@@ -149,6 +158,62 @@ TEST_F(UseCounting, GrowsByOne) {
   EXPECT_EQ(Lines{}, reply.log);
   EXPECT_EQ(1, CountUse(hash).code);
   EXPECT_EQ((std::vector<TextRow>{{"2"}, {"0"}}), Rows("SELECT use_count FROM entry ORDER BY id"));
+}
+
+// Starts a process that has written to every link, tells so, and commits after a while.
+pid_t StartWriter(std::chrono::milliseconds hold = std::chrono::milliseconds(500)) {
+  int ends[2];
+  if (pipe(ends) != 0) {
+    return -1;
+  }
+  const pid_t writer = fork();
+  if (writer == 0) {
+    SqliteFile file(TUVO::sharing::SZF_SHARING_DB_PATH);
+    file.Execute("BEGIN IMMEDIATE; UPDATE entry SET enabled = 0, use_count = 5");
+    close(ends[1]);
+    std::this_thread::sleep_for(hold);
+    file.Execute("COMMIT");
+    _exit(0);
+  }
+  close(ends[1]);
+  char byte = 0;
+  EXPECT_EQ(0, read(ends[0], &byte, 1));  // it has closed its end
+  close(ends[0]);
+  return writer;
+}
+
+// The count waits for the other writer, and so must have read nothing before.
+TEST_F(UseCounting, UndoesNothingThatIsWrittenMeanwhile) {
+  const std::string hash = MakeLink();
+  const pid_t writer = StartWriter();
+  const Reply reply = CountUse(hash);
+  int status = -1;
+  EXPECT_EQ(writer, waitpid(writer, &status, 0));
+  EXPECT_EQ(0, status);
+  EXPECT_EQ(1, reply.code);
+  EXPECT_EQ(Lines{}, reply.log);
+  EXPECT_EQ((std::vector<TextRow>{{"0", "6"}}), Rows("SELECT enabled, use_count FROM entry"));
+}
+
+// Which waits ten seconds, and must not go on without it then.
+TEST_F(UseCounting, FailsWhenTheFileStaysLocked) {
+  const std::string hash = MakeLink();
+  const pid_t writer = StartWriter(std::chrono::milliseconds(11500));
+  EXPECT_EQ(0, CountUse(hash).code);
+  int status = -1;
+  EXPECT_EQ(writer, waitpid(writer, &status, 0));
+  EXPECT_EQ("5", Count());
+}
+
+TEST_F(UseCounting, WithinATransactionOfTheCallersLeavesItOpen) {
+  const std::string hash = MakeLink();
+  const Reply reply = Run(Visit(), [&](std::string&) {
+    TUVO::sharing::db::SharingDB& db = TUVO::sharing::db::SharingDB::Instance();
+    const bool counted = db.Begin() && TUVO::TuvoSharingIncreaseUseCount(hash);
+    return counted && db.Execute("ROLLBACK") ? 1 : 0;
+  });
+  EXPECT_EQ(1, reply.code);
+  EXPECT_EQ("0", Count());
 }
 
 TEST_F(UseCounting, OfAnUnknownLinkChangesNothing) {
