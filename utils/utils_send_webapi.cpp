@@ -48,8 +48,11 @@ bool Parse(const std::string& text, Json::Value& value) {
 
 bool SendWebapi(Json::Value& reply, const std::string& api, int version, const std::string& method,
                 const Json::Value& params) {
+  // They may be the reply, or a part of it.
+  // NOLINTNEXTLINE(performance-unnecessary-copy-initialization)
+  const Json::Value given = params;
   reply = Json::Value(Json::objectValue);
-  const internal::Popen file(kTool, Arguments(api, version, method, params));
+  const internal::Popen file(kTool, Arguments(api, version, method, given));
   if (file.file == nullptr) {
     SHARING_LOG_PID("popen failed\n\n");
     return false;

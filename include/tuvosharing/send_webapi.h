@@ -12,7 +12,9 @@ namespace TUVO::sharing {
 // Runs the tool with the arguments "--exec", "api=" and `api`, "version=" and `version` in decimal,
 // "method=" and `method`, and one "name=value" for each member of `params`, sorted by name, the
 // value as Json::Value::asString gives it. They reach the tool as they are, without a shell and
-// without any quoting, each up to its first NUL byte. `params` is an object, or null for none.
+// without any quoting, each up to its first NUL byte, and other local users may see them while the
+// tool starts (in /proc). `params` is an object, or null for none; it may be `reply` or a part of
+// it.
 //
 // `reply` becomes an empty object at first, and then the JSON document that the tool prints; what
 // stands behind the document, and the tool's exit status, do not count. Waits for the tool to end.

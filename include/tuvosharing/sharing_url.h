@@ -13,8 +13,9 @@ namespace TUVO::sharing {
 enum _tag_SHARING_URL_TYPE : int {};
 
 // Runs the tool with five arguments: `s1`, `n` in decimal, `b` as "1" or "0", `s2`, `s3`. They
-// reach it as they are, without a shell, each up to its first NUL byte; what they mean is the
-// tool's business. The one of this system takes the project, the port (0: the usual one), whether
+// reach it as they are, without a shell, each up to its first NUL byte, and other local users may
+// see them, the hash among them, while the tool starts (in /proc). What they mean is the tool's
+// business. The one of this system takes the project, the port (0: the usual one), whether
 // it is https, a host or address to use instead of the configured one, and the link's hash.
 //
 // `url` is the first line of the tool's output without its last character, which is dropped even

@@ -9,15 +9,16 @@
 #include <utility>
 #include <vector>
 
-#include "visitor/unique_fd.h"
+#include "common/unique_fd.h"
 
 namespace visitor {
 
-// A piece of an open file.
+// A piece of a link's open file.
 struct FilePiece {
-  UniqueFd fd;
+  common::UniqueFd fd;
   std::int64_t offset = 0;
   std::int64_t length = 0;
+  int link = 0;  // the link's row
 };
 
 struct Answer {

@@ -80,7 +80,7 @@ Answer FileAnswer(const Request& request, SharedFile file, std::time_t now) {
               "bytes " + std::to_string(range.offset) + "-" +
                   std::to_string(range.offset + length - 1) + "/" + std::to_string(file.size));
   }
-  answer.file = FilePiece{std::move(file.fd), range.offset, length};
+  answer.file = FilePiece{std::move(file.fd), range.offset, length, file.link};
   return answer;
 }
 

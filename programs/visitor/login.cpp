@@ -5,6 +5,7 @@
 
 #include <string>
 
+#include "visitor/events.h"
 #include "visitor/page_answers.h"
 #include "visitor/session_address.h"
 #include "visitor/session_cookie.h"
@@ -50,6 +51,7 @@ Answer Login(const Request& request, TUVOCGI* cgi) {
   _tag_sharing_login_params params = ParamsOf(request, cgi);
   std::string session_id;
   const int code = TUVO::TuvoSharingLogin(session_id, &params, false);
+  LogLogin(request.route.hash, code);
   if (code != 1) {
     return RefusalAnswer(request, RefusedLogin(code),
                          params.zor_username == nullptr ? "" : params.zor_username);

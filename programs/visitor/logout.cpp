@@ -8,6 +8,7 @@
 
 #include <string>
 
+#include "visitor/events.h"
 #include "visitor/page_answers.h"
 
 namespace visitor {
@@ -46,9 +47,12 @@ Notice EndAccess(const Request& request) {
   if (!SharingDB::Instance().IsGood()) {
     return Notice::kLogoutFailed;
   }
-  const bool ended = !HasToken(request) ||
-                     TUVO::TuvoSharingLogout(request.route.hash, request.session_id) ||
-                     !HasToken(request);
+  if (!HasToken(request)) {
+    return Notice::kLoggedOut;
+  }
+  const bool ended =
+      TUVO::TuvoSharingLogout(request.route.hash, request.session_id) || !HasToken(request);
+  LogLogout(request.route.hash, ended);
   return ended ? Notice::kLoggedOut : Notice::kLogoutFailed;
 }
 

@@ -7,26 +7,32 @@
 
 namespace visitor {
 
+// The owner's page (programs/web/owner.css) has the same colours, type and spacing.
 const std::string_view kPageStyle =
-    ":root{color-scheme:light dark}"
+    ":root{color-scheme:light dark;--ground:#f4f6f8;--surface:#fff;--text:#1b2026;--line:#d3d9df;"
+    "--edge:#76818c;--link:#1a5fb4;--danger:#b0182b;--danger-ground:#fbeaec}"
+    "@media(prefers-color-scheme:dark){:root{--ground:#14181c;--surface:#1d2329;--text:#e7ebef;"
+    "--line:#37414b;--edge:#7f8a95;--link:#8ab8f2;--danger:#ff9aa5;--danger-ground:#3a1d22}}"
     "*{box-sizing:border-box}"
-    "body{margin:0;padding:1rem;font:1rem/1.5 system-ui,sans-serif;background:Canvas;"
-    "color:CanvasText}"
-    "main{max-width:26rem;margin:min(12vh,4rem) auto 0;padding:1.5rem 2rem 2rem;border:1px solid "
-    "GrayText;"
-    "border-radius:.75rem}"
+    "body{margin:0;padding:1rem;font:1rem/1.5 system-ui,sans-serif;background:var(--ground);"
+    "color:var(--text)}"
+    "main{max-width:26rem;margin:min(12vh,4rem) auto 0;padding:1.5rem 2rem 2rem;"
+    "border:1px solid var(--line);border-radius:.75rem;background:var(--surface)}"
     "h1{margin:0 0 .75rem;font-size:1.35rem;line-height:1.3;overflow-wrap:anywhere}"
     "p{margin:0 0 1rem}"
     "main>:last-child{margin-bottom:0}"
-    "label{display:block;margin:0 0 .25rem;font-weight:600}"
-    "input{display:block;width:100%;margin:0 0 1rem;padding:.6rem .7rem;font:inherit;"
-    "border:1px solid GrayText;border-radius:.4rem;background:Field;color:FieldText}"
-    "button{width:100%;padding:.65rem;font:inherit;font-weight:600;border:0;border-radius:.4rem;"
-    "background:#1a5fb4;color:#fff;cursor:pointer}"
+    "label{display:block;margin:0 0 .2rem;font-weight:600}"
+    "input{display:block;width:100%;margin:0 0 1rem;padding:.6rem;font:inherit;color:inherit;"
+    "border:1px solid var(--edge);border-radius:.4rem;background:var(--surface)}"
+    "button{width:100%;padding:.65rem;font:inherit;font-weight:600;border:1px solid transparent;"
+    "border-radius:.4rem;background:#1a5fb4;color:#fff;cursor:pointer}"
     "button:hover{background:#154d92}"
-    ":focus-visible{outline:3px solid #62a0ea;outline-offset:2px}"
-    ".complaint{padding:.6rem .8rem;border-left:.3rem solid #c01c28;background:#c01c281a}";
-const std::string_view kPageStyleDigest = "Uvsd4Kg1hYfyZBPod5aV2Mfp6lLsCd+lHYNCZL4Dfdg=";
+    "a{color:var(--link)}"
+    ":focus-visible{outline:3px solid var(--link);outline-offset:2px}"
+    ".complaint~form input{border-color:var(--danger)}"
+    ".complaint{padding:.6rem .8rem;border-left:.3rem solid var(--danger);"
+    "background:var(--danger-ground)}";
+const std::string_view kPageStyleDigest = "J3rhe3fgLH9eEeCCxXd9KPsI36IyHQaQvuwP8xTjFQo=";
 
 namespace {
 

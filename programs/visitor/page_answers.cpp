@@ -1,7 +1,7 @@
 #include "visitor/page_answers.h"
 
+#include "common/redirect_target.h"
 #include "visitor/link.h"
-#include "visitor/redirect_target.h"
 
 namespace visitor {
 
@@ -40,7 +40,8 @@ Ask AskOf(const Entry& entry) {
 }
 
 bool LeadsAway(const Entry& entry) {
-  return entry.get_redirect_type() != Entry::REDIRECT_NONE && NamesHost(entry.get_redirect_uri());
+  return entry.get_redirect_type() != Entry::REDIRECT_NONE &&
+         common::NamesHost(entry.get_redirect_uri());
 }
 
 }  // namespace

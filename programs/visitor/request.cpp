@@ -4,6 +4,8 @@
 
 #include <cstdlib>
 
+#include "common/hash_text.h"
+
 namespace visitor {
 
 namespace {
@@ -29,7 +31,7 @@ std::string SessionIdOf(TUVOCGI* cgi) {
     return {};
   }
   const char* value = TuvoCgiGetCookie(cgi, TUVO::sharing::SZK_SHARING_SID);
-  return value != nullptr && IsSessionIdText(value) ? value : "";
+  return value != nullptr && common::IsSessionIdText(value) ? value : "";
 }
 
 // Browsers say so themselves (over HTTPS); other programs say nothing.

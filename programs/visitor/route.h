@@ -21,16 +21,11 @@ struct Route {
   std::string hash;  // empty for kNowhere
 };
 
-// Whether `text` can be a link's hash: 3 to 64 ASCII letters, digits, '-' and '_'.
-bool IsHashText(std::string_view text);
-
-// Whether `text` can be a session's identifier: 1 to 64 of the same characters.
-bool IsSessionIdText(std::string_view text);
-
 // Reads CGI's PATH_INFO: "/<hash>" or "/<hash>/logout"; anything else leads nowhere.
 Route ParseRoute(std::string_view path_info);
 
-// The address, without the host, of a link and of its logout page. Precondition: IsHashText(hash).
+// The address, without the host, of a link and of its logout page. Precondition:
+// common::IsHashText.
 std::string LinkPath(std::string_view hash);
 std::string LogoutPath(std::string_view hash);
 

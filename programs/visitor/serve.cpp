@@ -9,9 +9,9 @@
 #include <optional>
 #include <string>
 
+#include "common/redirect_target.h"
 #include "visitor/file_answer.h"
 #include "visitor/page_answers.h"
-#include "visitor/redirect_target.h"
 #include "visitor/shared_file.h"
 
 namespace visitor {
@@ -52,7 +52,7 @@ void LogNoFile(const Entry& entry, const char* what) {
 }
 
 Answer SendOn(const Entry& entry) {
-  const std::optional<std::string> target = RedirectTarget(entry.get_redirect_uri());
+  const std::optional<std::string> target = common::RedirectTarget(entry.get_redirect_uri());
   if (!target) {
     return Misconfigured(entry, "redirect address");
   }
@@ -78,6 +78,7 @@ Answer ServeFile(const Request& request, const Entry& entry) {
     case OpenResult::kOpened:
       break;
   }
+  file.link = entry.get_id();
   return FileAnswer(request, std::move(file), std::time(nullptr));
 }
 

@@ -1,21 +1,19 @@
 #include "visitor/session_address.h"
 
-#include <tuvoplatform/cgi.h>
 #include <tuvosharing/session_db.h>
 #include <tuvosharing/sharing_db.h>
 
-#include <array>
+#include "common/client_address.h"
 
 namespace visitor {
 
 bool IsSessionOfThisAddress(const std::string& session_id) {
-  constexpr size_t kAddressSize = 65;
-  std::array<char, kAddressSize> address{};
+  const std::string address = common::ClientAddress();
   TUVO::sharing::record::Session session;
-  return TuvoCgiGetRemoteIP(address.data(), address.size()) == 0 &&
+  return !address.empty() &&
          TUVO::sharing::db::SessionDB(TUVO::sharing::db::SharingDB::Instance())
              .GetBySessionId(session_id, session) &&
-         session.get_ip() == address.data();
+         session.get_ip() == address;
 }
 
 }  // namespace visitor

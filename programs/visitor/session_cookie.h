@@ -4,7 +4,7 @@
 
 #include <tuvoplatform/cgi.h>
 
-#include <cstdio>
+#include <optional>
 #include <string>
 
 namespace visitor {
@@ -13,9 +13,9 @@ namespace visitor {
 // long as the browser runs, the session ends by itself. False when it cannot be queued.
 bool QueueSessionCookie(TUVOCGI* cgi, const std::string& session_id);
 
-// Writes that cookie's header line and no other queued cookie's: the library queues one ("id") of
-// whatever a stranger puts into the parameter "_sid". False on a write error.
-bool WriteSessionCookie(TUVOCGI* cgi, std::FILE* out);
+// That cookie's header line, with its end, and no other queued cookie's: the library queues one
+// ("id") of whatever a stranger puts into the parameter "_sid". Nothing when memory ran out.
+std::optional<std::string> SessionCookieLine(TUVOCGI* cgi);
 
 }  // namespace visitor
 

@@ -2,11 +2,14 @@
 
 #include <fcntl.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include <array>
 #include <cerrno>
 #include <cinttypes>
+#include <climits>
 #include <cstdio>
+#include <filesystem>
 
 namespace visitor {
 
@@ -20,6 +23,18 @@ constexpr int kOpenFlags = O_RDONLY | O_NOFOLLOW | O_CLOEXEC | O_NONBLOCK | O_NO
 
 bool IsSystemsOwn(const struct stat& st) {
   return st.st_uid == kSystemUid && (st.st_mode & S_IROTH) == 0;
+}
+
+// Whether the kernel knows the open file by this very path. Another one means that a folder on the
+// way has become a symbolic link since the link was made: whoever may write to a shared folder
+// could so have any file served that this program can read.
+bool IsStillAt(int fd, const std::string& path) {
+  std::array<char, PATH_MAX> place{};
+  const std::string name = "/proc/self/fd/" + std::to_string(fd);
+  const ssize_t length = readlink(name.c_str(), place.data(), place.size());
+  return length > 0 && static_cast<size_t>(length) < place.size() &&
+         std::string_view(place.data(), static_cast<size_t>(length)) ==
+             std::filesystem::path(path).lexically_normal().native();
 }
 
 std::uint64_t Nanoseconds(const struct timespec& time) {
@@ -54,13 +69,16 @@ OpenResult OpenShared(const std::string& path, SharedFile* file) {
   if (path.empty() || path.front() != '/' || path.find('\0') != std::string::npos) {
     return Failed(EINVAL, OpenResult::kNotReadable);
   }
-  UniqueFd fd(open(path.c_str(), kOpenFlags));
+  common::UniqueFd fd(open(path.c_str(), kOpenFlags));
   struct stat st {};
   if (fd.get() < 0 || fstat(fd.get(), &st) != 0) {
     return Refused();
   }
   if (!S_ISREG(st.st_mode)) {
     return Failed(EINVAL, OpenResult::kGone);
+  }
+  if (!IsStillAt(fd.get(), path)) {
+    return Failed(ELOOP, OpenResult::kGone);
   }
   if (IsSystemsOwn(st)) {
     return Failed(EACCES, OpenResult::kNotReadable);

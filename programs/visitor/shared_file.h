@@ -6,14 +6,15 @@
 #include <string>
 #include <string_view>
 
+#include "common/unique_fd.h"
 #include "visitor/preconditions.h"
-#include "visitor/unique_fd.h"
 
 namespace visitor {
 
 // An open file and what its headers say.
 struct SharedFile {
-  UniqueFd fd;
+  common::UniqueFd fd;
+  int link = 0;      // the row of the link that shares it
   std::string name;  // without folders
   std::int64_t size = 0;
   Validators validators;
@@ -25,10 +26,10 @@ enum class OpenResult {
   kNotReadable,  // it is there, and this program may not, or must not, read it
 };
 
-// Opens the regular file at the absolute `path` under the effective ids of the moment. A symbolic
-// link as the last component is not followed. A file that is the system identity's own and closed
-// to others (the database of links is one) is never opened, whoever asks. `*file` is filled on
-// kOpened alone; errno tells the reason of a failure.
+// Opens the regular file at the absolute `path` under the effective ids of the moment. No symbolic
+// link is followed, wherever it stands in the path; ".." goes by the path's text. A file that is
+// the system identity's own and closed to others (the database of links is one) is never opened,
+// whoever asks. `*file` is filled on kOpened alone; errno tells the reason of a failure.
 OpenResult OpenShared(const std::string& path, SharedFile* file);
 
 }  // namespace visitor

@@ -2,6 +2,7 @@
 
 #include <tuvosharing/login.h>
 
+#include "visitor/events.h"
 #include "visitor/link.h"
 #include "visitor/page_answers.h"
 #include "visitor/serve.h"
@@ -25,6 +26,7 @@ Answer Visit(const Request& request) {
   }
   const int code = IsAuthorized(request);
   if (code != 1) {
+    LogRefusal(request.route.hash, code);
     return RefusalAnswer(request, RefusedVisit(code));
   }
   TUVO::sharing::record::Entry entry;

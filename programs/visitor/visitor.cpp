@@ -1,5 +1,6 @@
 #include "visitor/visitor.h"
 
+#include "visitor/events.h"
 #include "visitor/login.h"
 #include "visitor/logout.h"
 #include "visitor/page_answers.h"
@@ -21,6 +22,7 @@ Answer Handle(const Request& request, TUVOCGI* cgi) {
   // Any web page could otherwise make its visitors' browsers try passwords here, until their
   // addresses are locked out.
   if (request.from_elsewhere) {
+    LogRefusal(request.route.hash, kFromAnotherSite);
     return NoticeAnswer(Notice::kFromElsewhere);
   }
   return logs_out ? Logout(request) : Login(request, cgi);

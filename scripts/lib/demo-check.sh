@@ -154,7 +154,113 @@ check_block() {
   step "other addresses are let in meanwhile"
 }
 
+# ask NAME PASSWORD [CURL ARGUMENT...]: a request to the web API; prints the status.
+ask() {
+  local who=$1:$2
+  shift 2
+  curl --silent --max-time 60 --user "$who" --output "$work/body" --write-out '%{http_code}' "$@"
+}
+
+# call NAME JSON [CURL ARGUMENT...]: the same by POST.
+call() {
+  local name=$1 body=$2
+  shift 2
+  ask "$name" "$name-secret" --header 'Content-Type: application/json' --data "$body" "$@" \
+    "$address/webapi/entry.cgi"
+}
+
+# member NAME: what the last answer says, by its path within "data".
+member() {
+  python3 -c 'import json, sys
+value = json.load(open(sys.argv[1]))["data"]
+for name in sys.argv[2].split("."):
+    value = value[int(name)] if isinstance(value, list) else value[name]
+print(value)' "$work/body" "$1"
+}
+
+check_owner_login() {
+  expect 401 "$(curl --silent --output "$work/body" --write-out '%{http_code}' "$address/owner/")" \
+    "the owner's page without an account"
+  expect 401 "$(ask alice guess "$address/owner/")" "the owner's page with a wrong password"
+  expect 401 "$(ask alice guess "$address/webapi/entry.cgi")" "the web API with a wrong password"
+  step "the owner's page and the web API ask for an account"
+  expect 200 "$(ask alice alice-secret "$address/owner/")" "the owner's page"
+  grep -q '<title>' "$work/body" || fail "the owner's page is none"
+  step "the owner's page opens for alice"
+}
+
+check_owner_link() {
+  local id path
+  expect 200 "$(call alice '{"api": "TUVO.Sharing.Link", "version": 1, "method": "create",
+    "project_name": "file", "app": {"path": "'"$sample"'"}, "protect_title": "From alice",
+    "protect_password": "honey", "expire_at": "+7d", "expire_times": 5}')" "making a link"
+  id=$(member link.id)
+  path=$(member url)
+  [ "${path#"$address"}" != "$path" ] || fail "the link's address is $path"
+  path=${path#"$address"}
+  step "alice makes a link with a password for five uses"
+  expect 403 "$(visit max 127.0.0.1 "$path" --data 'password=jam')" "her link, a wrong password"
+  expect 303 "$(visit max 127.0.0.1 "$path" --data 'password=honey')" "her link, the password"
+  expect 200 "$(visit max 127.0.0.1 "$path")" "her link, once opened"
+  file_arrived "alice's link"
+  step "a visitor is refused without its password, and gets the file with it"
+  call alice '{"api": "TUVO.Sharing.Link", "version": 1, "method": "get", "id": '"$id"'}' >/dev/null
+  [ "$(member link.use_count)" = 1 ] || fail "the use is not counted"
+  call alice '{"api": "TUVO.Sharing.Link", "version": 1, "method": "sessions", "id": '"$id"'}' \
+    >/dev/null
+  [ "$(member sessions.0.ip)" = 127.0.0.1 ] || fail "alice does not see her visitor"
+  step "alice sees the use and the visitor"
+  expect 404 "$(call bob '{"api": "TUVO.Sharing.Link", "version": 1, "method": "delete",
+    "id": '"$id"'}')" "bob deleting alice's link"
+  step "bob can neither see nor delete it"
+  expect 403 "$(call alice '{"api": "TUVO.Sharing.Link", "version": 1, "method": "delete",
+    "id": '"$id"'}' --header 'Origin: https://elsewhere.example')" "another site deleting it"
+  step "a page of another site cannot do it in alice's name"
+  expect 200 "$(call alice '{"api": "TUVO.Sharing.Link", "version": 1, "method": "set",
+    "id": '"$id"', "enabled": false}')" "switching the link off"
+  expect 404 "$(visit max 127.0.0.1 "$path")" "the link that is switched off"
+  step "switched off, it looks like one that never was, even to who was in"
+  expect 200 "$(call alice '{"api": "TUVO.Sharing.Link", "version": 1, "method": "delete",
+    "id": '"$id"'}')" "deleting the link"
+  step "alice deletes it"
+}
+
+check_owner_file() {
+  expect 403 "$(call alice '{"api": "TUVO.Sharing.Link", "version": 1, "method": "create",
+    "project_name": "file", "app": {"path": "/etc/passwd"}}')" "a file outside of the folders"
+  expect 403 "$(call alice '{"api": "TUVO.Sharing.Link", "version": 1, "method": "create",
+    "project_name": "file", "app": {"path": "'"$share"'/../../../etc/passwd"}}')" "a way out"
+  step "no link is made for a file outside of the shared folders"
+}
+
+check_command() {
+  local tool=/usr/tuvo/bin/tuvosharing hash before
+  before=$("$tool" list --json | python3 -c 'import json, sys; print(json.load(sys.stdin)["total"])')
+  hash=$(printf 'from the shell\n' | "$tool" create --owner alice --project file --path "$sample" \
+    --expire +7d --password-stdin --quiet) || fail "the command makes no link"
+  "$tool" list --json | python3 -c 'import json, sys
+answer = json.load(sys.stdin)
+assert answer["total"] == int(sys.argv[1]) + 1
+assert any(link["hash"] == sys.argv[2] and link["state"] == "live" for link in answer["links"])' \
+    "$before" "$hash" || fail "the command does not list its link"
+  step "the command tuvosharing makes a link and lists it"
+  expect 303 "$(visit ned 127.0.0.1 "/sharing/$hash" --data 'password=from the shell')" "its link"
+  "$tool" edit "$hash" --uses 1 --use-count 1 >/dev/null || fail "the command changes nothing"
+  expect 410 "$(visit oli 127.0.0.1 "/sharing/$hash" --data 'password=from the shell')" "used up"
+  step "a visitor opens it; the command ends its uses"
+  "$tool" backup "$work/backup.db" >/dev/null || fail "no backup"
+  "$tool" check >/dev/null || fail "the check of the database finds something: $("$tool" check)"
+  "$tool" delete --yes "$hash" >/dev/null || fail "the command does not delete"
+  [ "$(sqlite3 "$work/backup.db" "SELECT count(*) FROM entry WHERE hash = '$hash'")" = 1 ] ||
+    fail "the backup lacks the link"
+  step "it backs the database up, checks it, and deletes the link"
+}
+
 check_everything() {
+  check_owner_login
+  check_owner_link
+  check_owner_file
+  check_command
   check_open
   check_password
   check_accounts

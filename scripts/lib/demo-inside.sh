@@ -9,7 +9,8 @@ mode=$1 port=$2 build=$PWD/$3
 work=/tmp/demo
 log=/tmp/lighttpd.log # where the web server may write under its own id
 address=http://127.0.0.1:$port
-sample="$work/Sommer – summer report.txt"
+share=$work/share
+sample="$share/Sommer – summer report.txt"
 links=$build/programs/demo/tuvosharing-demo-links
 server=
 
@@ -34,15 +35,19 @@ fail() {
 }
 
 lay_out() {
-  mkdir -p "$work"
+  mkdir -p "$share"
   cmake --install "$build" --prefix /usr/tuvo >"$work/install.log" 2>&1 || {
     cat "$work/install.log" >&2
     fail "the project could not be installed"
   }
   # Set-user-id root, for the web server alone: started by hand, by somebody who makes up the
-  # client's address, the program would count failed logins for whomever he likes.
-  chown root:www-data /usr/tuvo/bin/sharing.cgi
-  chmod 4750 /usr/tuvo/bin/sharing.cgi
+  # client's address or the account, the programs would believe it.
+  chown root:www-data /usr/tuvo/bin/sharing.cgi /usr/tuvo/bin/entry.cgi
+  chmod 4750 /usr/tuvo/bin/sharing.cgi /usr/tuvo/bin/entry.cgi
+  cat >/usr/tuvo/etc/tuvosharing.conf <<CONF
+external_address = $address
+share_folder = $share
+CONF
   seq 1 40000 | sed 's/$/ sunny days on the balcony/' >"$sample"
 }
 
@@ -84,6 +89,12 @@ Sharing links are open at $address until Ctrl-C. Try them in a browser:
       sends you on to www.debian.org once you have opened it
   $address$(link other)
       belongs to another application, which would show its pictures
+
+Links are made, changed and removed on the owner's page:
+
+  $address/owner/
+      log in as alice with alice-secret, or as carol with carol-secret, who is an administrator and
+      sees everybody's links; a file to share: $sample
 
 Add /logout to an address to leave that link again. Ten wrong passwords from one address lock that
 address out for half an hour; starting the demonstration again forgets everything.

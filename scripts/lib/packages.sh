@@ -17,6 +17,9 @@ libgcrypt20-dev     # salted SHA-1 of link passwords
 libssl-dev          # MD5 of link passwords
 libpam0g-dev        # account logins
 libcgicc-dev        # request parameters of the CGI programs
+libcli11-dev        # options of the command-line programs
+libfcgi-dev         # the web programs as long-lived FastCGI programs
+libqrencode-dev     # QR codes of links' addresses
 libgtest-dev        # the tests
 clang-format        # the test of the sources' format
 python3             # tests: the order of the layers; the programs as a browser meets them
@@ -25,12 +28,19 @@ chromium            # that browser
 chromium-driver     # what selenium drives it through
 strace              # tests: in which order the programs give up root and read the request
 procps              # tests: ps, which processes a program leaves
+iproute2            # tests: network interfaces of their own, for what the machine is called
 sqlite3             # tests: the database file looked at from outside
 abigail-tools       # tests: compare the binary interface with the kept one
 openssl             # the passwords of the private accounts
 util-linux          # unshare: the private namespaces that tests and demonstration run in
 mount               # lays those out
 lighttpd            # the web server in front of the programs
+lighttpd-mod-authn-pam # its logins of owners, against PAM
+nginx-light         # tests: another web server in front of the programs
+libnginx-mod-http-auth-pam # the same of that one
+zbar-tools          # tests: a QR code read as a camera would
+man-db              # tests: the manual pages
+bash-completion     # tests: the shell's completion
 media-types         # /etc/mime.types, from which the programs name a file's type
 curl                # the demonstration's visitor
 LIST
@@ -78,7 +88,9 @@ tuvo_apt_install() (
   options=(-qq -o DPkg::Lock::Timeout=300 -o Acquire::Retries=3)
   apt-get "${options[@]}" update
   apt-get "${options[@]}" install --yes --no-install-recommends "$@" </dev/null
-  case " $* " in
-    *" lighttpd "*) update-rc.d lighttpd disable >/dev/null ;;  # nor at the next boot
-  esac
+  for service in lighttpd:lighttpd nginx-light:nginx; do  # nor at the next boot
+    case " $* " in
+      *" ${service%:*} "*) update-rc.d "${service#*:}" disable >/dev/null ;;
+    esac
+  done
 )

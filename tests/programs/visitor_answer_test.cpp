@@ -25,7 +25,7 @@ TEST(VisitorAnswer, HeadersComeAsCgiHasThem) {
 TEST(VisitorAnswer, LengthOfAPieceOfAFile) {
   Answer answer;
   answer.status = 206;
-  answer.file = FilePiece{UniqueFd(), 7, 5000000000};
+  answer.file = FilePiece{common::UniqueFd(), 7, 5000000000};
   EXPECT_NE(HeaderLines(answer).find("\r\nContent-Length: 5000000000\r\n"), std::string::npos);
 }
 

@@ -3,129 +3,32 @@ TUVO_SCREENSHOTS set to a folder, a picture of every page is left there."""
 
 import http.server
 import os
-import socket
 import sys
-import tempfile
 import threading
-import time
 import unittest
 
+import browser
 import visitor_server as vs
+from browser import By, Keys
 from visitor_server import make_file_link, make_link, sql
-
-CHROMIUM = "/usr/bin/chromium"
-DRIVER = "/usr/bin/chromedriver"
-for needed, package in (CHROMIUM, "chromium"), (DRIVER, "chromium-driver"):
-    if not os.path.exists(needed):
-        vs.skip(f"the package {package} is missing")
-try:
-    from selenium import webdriver
-    from selenium.common.exceptions import WebDriverException
-    from selenium.webdriver.chrome.service import Service
-    from selenium.webdriver.common.by import By
-    from selenium.webdriver.common.keys import Keys
-except ImportError:
-    vs.skip("the package python3-selenium is missing")
-
-# The browser and its driver talk to each other by that name.
-try:
-    socket.getaddrinfo("localhost", 80)
-except OSError:
-    vs.skip("the name localhost is not known here: no /etc/hosts")
 
 SERVER = None
 FILE = "/tmp/shared/Übersicht 2024.txt"
 CONTENT = os.urandom(400000)
-DOWNLOADS = "/tmp/downloads"
-FLAGS = ("--headless", "--no-sandbox", "--disable-gpu", "--disable-quic", "--no-first-run",
-         "--disable-background-networking", "--disable-component-update", "--disable-sync",
-         "--host-resolver-rules=MAP * ~NOTFOUND, EXCLUDE 127.0.0.1", "--no-proxy-server",
-         "--window-size=800,640")
 
 
-class BrowserTest(unittest.TestCase):
+class BrowserTest(browser.Browser, unittest.TestCase):
     def setUp(self):
-        self.profile = tempfile.TemporaryDirectory(ignore_cleanup_errors=True)
-        self.addCleanup(self.profile.cleanup)
-        os.makedirs(DOWNLOADS, exist_ok=True)
-        options = webdriver.ChromeOptions()
-        options.binary_location = CHROMIUM
-        for flag in FLAGS + ("--user-data-dir=" + self.profile.name,):
-            options.add_argument(flag)
-        options.add_experimental_option("prefs", {"download.default_directory": DOWNLOADS,
-                                                  "download.prompt_for_download": False})
-        options.set_capability("goog:loggingPrefs", {"browser": "ALL"})
-        self.browser = webdriver.Chrome(service=Service(DRIVER), options=options)
-        self.addCleanup(self.browser.quit)
-        self.browser.set_page_load_timeout(60)
+        self.start()
+        self.addCleanup(self.quit)
 
     def open(self, path):
-        self.browser.get(f"http://127.0.0.1:{SERVER.port}{path}")
-
-    def picture(self, name):
-        folder = os.environ.get("TUVO_SCREENSHOTS")
-        if folder:
-            self.browser.save_screenshot(os.path.join(folder, name + ".png"))
-
-    def wait_for(self, look, wanted):
-        """A pressed button or link returns before the next page is there."""
-        seen = None
-        for _ in range(200):
-            try:
-                seen = look()
-                if wanted(seen):
-                    return
-            except WebDriverException:
-                pass  # between two pages
-            time.sleep(0.05)
-        self.fail(f"the browser ends up with: {seen}")
-
-    def text(self):
-        return self.browser.find_element(By.TAG_NAME, "main").text
-
-    def assert_heading(self, text):
-        self.wait_for(lambda: self.browser.find_element(By.TAG_NAME, "h1").text,
-                      lambda seen: seen == text)
-
-    def assert_says(self, text):
-        self.wait_for(self.text, lambda seen: text in seen)
-
-    def assert_arrives_at(self, address):
-        self.wait_for(lambda: self.browser.current_url, lambda seen: seen == address)
-
-    def field(self, label):
-        """By its label, as a person finds it."""
-        element = self.browser.find_element(By.XPATH, f"//label[.='{label}']")
-        return self.browser.find_element(By.ID, element.get_attribute("for"))
-
-    def has_focus(self, element):
-        return self.browser.switch_to.active_element == element
-
-    def press(self, button):
-        self.browser.find_element(By.XPATH, f"//button[.='{button}']").click()
+        self.go(f"http://127.0.0.1:{SERVER.port}{path}")
 
     def assert_rendered(self):
         """The style was let through, and nothing was refused by the pages' policy."""
-        radius = self.browser.execute_script(
-            "return getComputedStyle(document.querySelector('main')).borderTopLeftRadius")
-        self.assertEqual(radius, "12px")
-        complaints = [entry["message"] for entry in self.browser.get_log("browser")
-                      if "Security Policy" in entry["message"]]
-        self.assertEqual(complaints, [])
-
-    def downloaded(self):
-        for _ in range(200):
-            names = os.listdir(DOWNLOADS)
-            # The browser writes under a hidden name, then under one of its own, before the file's.
-            if names and not any(name.startswith(".") or name.endswith(".crdownload")
-                                 for name in names):
-                path = os.path.join(DOWNLOADS, names[0])
-                with open(path, "rb") as file:
-                    content = file.read()
-                os.unlink(path)
-                return names[0], content
-            time.sleep(0.05)
-        self.fail("nothing was downloaded; the page says: " + self.text())
+        self.assertEqual(self.style("main", "borderTopLeftRadius"), "12px")
+        self.assertEqual(self.policy_complaints(), [])
 
     def assert_file_arrives(self):
         name, content = self.downloaded()
@@ -248,13 +151,12 @@ class Pages(BrowserTest):
         self.assert_arrives_at(f"http://127.0.0.1:{SERVER.port}/sharing/elsewhere")
 
     def test_narrow_screen(self):
-        self.browser.set_window_size(360, 640)
+        self.set_size(360, 640)
         link = make_file_link(FILE, protect_type="password", password="x",
                               protect_title="Averyveryverylongwordwithoutanyblankinit" * 3)
         self.open("/sharing/" + link)
         self.picture("narrow")
-        self.assertFalse(self.browser.execute_script(
-            "return document.documentElement.scrollWidth > window.innerWidth"))
+        self.assertTrue(self.fits_width())
 
 
 class OtherSite:

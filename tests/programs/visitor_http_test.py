@@ -561,21 +561,16 @@ class Files(VisitorTest):
         response = connection.getresponse()
         for _ in range(200):
             self.assertEqual(len(response.read(1024 * 1024)), 1024 * 1024)
-        self.assertEqual(len(self.programs()), 1)
+        self.assertEqual(len(SERVER.programs()), 1)
         # Neither side holds more than a little of it.
-        for pid in (SERVER.process.pid, self.programs()[0]):
+        for pid in (SERVER.process.pid, SERVER.programs()[0]):
             self.assertLess(peak_memory(pid), 32 * 1024)
         connection.close()
         for _ in range(200):
-            if not self.programs():
+            if not SERVER.programs():
                 break
             time.sleep(0.05)
-        self.assertEqual(self.programs(), [])
-
-    def programs(self):
-        done = subprocess.run(["ps", "-o", "pid=", "--ppid", str(SERVER.process.pid)],
-                              stdout=subprocess.PIPE)
-        return [int(pid) for pid in done.stdout.split()]
+        self.assertEqual(SERVER.programs(), [])
 
 
 def read(path):
@@ -794,6 +789,40 @@ class Identities(VisitorTest):
             self.assertIn("(INJECTED)", trace)
             self.assertNotIn("sharing.db", trace)
             self.assertNotIn("read(0, ", trace)
+
+
+class BehindAProxy(VisitorTest):
+    """Of which the web server is told whom to believe."""
+
+    @classmethod
+    def setUpClass(cls):
+        trust = ('server.modules += ( "mod_extforward" )\n'
+                 'extforward.forwarder = ( "127.0.0.80" => "trust" )\n'
+                 'extforward.headers = ( "X-Forwarded-For" )\n')
+        cls.server = vs.WebServer(vs.changed_configuration("include", trust + "include"))
+        cls.server.__enter__()
+        cls.addClassCleanup(cls.server.__exit__)
+
+    def session_address(self, address, **headers):
+        visitor = Visitor(self.server, address)
+        self.reply = visitor.post(path_of(make_file_link(FILE)), **headers)
+        return sql("SELECT ip FROM session WHERE session_id=?", visitor.session_id)[0][0]
+
+    def test_the_proxys_word_counts(self):
+        address = self.session_address("127.0.0.80", X_Forwarded_For="192.0.2.1",
+                                       X_Forwarded_Proto="https")
+        self.assertEqual(address, "192.0.2.1")
+        self.assertTrue(self.reply.get("Set-Cookie").endswith("; Secure"))
+
+    def test_nobody_elses_does(self):
+        address = self.session_address("127.0.0.81", X_Forwarded_For="192.0.2.1",
+                                       X_Forwarded_Proto="https")
+        self.assertEqual(address, "127.0.0.81")
+        self.assertFalse(self.reply.get("Set-Cookie").endswith("; Secure"))
+
+    def test_what_a_visitor_claimed_to_the_proxy_does_not(self):
+        address = self.session_address("127.0.0.80", X_Forwarded_For="198.51.100.1, 192.0.2.1")
+        self.assertEqual(address, "192.0.2.1")
 
 
 class Log(VisitorTest):

@@ -14,6 +14,7 @@ import urllib.parse
 
 PROGRAM = "/usr/tuvo/bin/sharing.cgi"
 PLAIN_PROGRAM = "/usr/tuvo/bin/plain.cgi"  # the same without the set-user-id bit
+OWNERS_PROGRAM = "/usr/tuvo/bin/entry.cgi"
 DATABASE = "/usr/tuvo/etc/private/session/sharing.db"
 WWW_DATA = 33
 SYSTEM = 1
@@ -30,7 +31,7 @@ def skip(reason):
 
 
 def install(build, project):
-    """Installs the build into the private /usr/tuvo, the program set-user-id root."""
+    """Installs the build into the private /usr/tuvo, the web programs set-user-id root."""
     global _build, _project
     if os.environ.get("TUVO_PRIVATE_ROOT") != "1" or os.getuid() != 0:
         skip("runs as root inside scripts/private-root only")
@@ -40,8 +41,15 @@ def install(build, project):
     subprocess.run(["cmake", "--install", build, "--prefix", "/usr/tuvo"], check=True,
                    stdout=subprocess.DEVNULL)
     subprocess.run(["install", "-m", "0755", PROGRAM, PLAIN_PROGRAM], check=True)
-    os.chown(PROGRAM, 0, WWW_DATA)
-    os.chmod(PROGRAM, 0o4750)
+    for program in PROGRAM, OWNERS_PROGRAM:
+        os.chown(program, 0, WWW_DATA)
+        os.chmod(program, 0o4750)
+
+
+def is_sanitized():
+    """Whether the build's allocator keeps what is freed, so that memory says nothing."""
+    done = subprocess.run(["ldd", PLAIN_PROGRAM], stdout=subprocess.PIPE)
+    return b"asan" in done.stdout
 
 
 def free_port():
@@ -50,8 +58,41 @@ def free_port():
         return probe.getsockname()[1]
 
 
+def fastcgi_configuration(sockets="/tmp/run", processes=1):
+    """Writes a configuration with everything by FastCGI; its path. A folder of sockets is for one
+    server: a second one would find the programs of the first there."""
+    folder = _project + "/packaging/lighttpd/"
+    os.makedirs(sockets, mode=0o700, exist_ok=True)
+    os.chown(sockets, WWW_DATA, WWW_DATA)
+    with open(folder + "standalone.conf") as file:
+        text = file.read()
+    parts = f'var.tuvosharing_run = "{sockets}"\n'
+    for name in "owner.conf", "webapi-fastcgi.conf", "sharing-fastcgi.conf":
+        with open(folder + name) as file:
+            part = re.sub(r'"max-procs" => \d+', f'"max-procs" => {processes}', file.read())
+        with open("/tmp/" + name, "w") as file:
+            file.write(part)
+        parts += f'include "{name}"\n'
+    with open("/tmp/fastcgi.conf", "w") as file:
+        file.write(text.split("include", 1)[0] + parts)
+    return "/tmp/fastcgi.conf"
+
+
+def changed_configuration(old, new):
+    """Writes a configuration like the project's, with the first `old` made `new`; its path."""
+    folder = _project + "/packaging/lighttpd/"
+    with open(folder + "standalone.conf") as file:
+        text = file.read()
+    with open("/tmp/changed.conf", "w") as file:
+        file.write(text.replace(old, new, 1).replace('include "', f'include "{folder}'))
+    return "/tmp/changed.conf"
+
+
 class WebServer:
-    """The web server with the project's configuration, for the lifetime of a `with`."""
+    """The web server with the project's configuration, or another, for the lifetime of a `with`."""
+
+    def __init__(self, configuration=None):
+        self.configuration = configuration or _project + "/packaging/lighttpd/standalone.conf"
 
     def __enter__(self):
         for _ in range(5):  # somebody may be quicker to take the free port
@@ -64,7 +105,7 @@ class WebServer:
     def _start(self):
         environment = dict(os.environ, TUVO_PORT=str(self.port), TUVO_LOG="/tmp/lighttpd.log")
         self.process = subprocess.Popen(
-            ["/usr/sbin/lighttpd", "-D", "-f", _project + "/packaging/lighttpd/standalone.conf"],
+            ["/usr/sbin/lighttpd", "-D", "-f", self.configuration],
             env=environment, stdin=subprocess.DEVNULL)
         for _ in range(200):
             if self.process.poll() is not None:
@@ -76,6 +117,12 @@ class WebServer:
                 time.sleep(0.05)
         self.process.kill()
         return False
+
+    def programs(self):
+        """The processes that it has started."""
+        done = subprocess.run(["ps", "-o", "pid=", "--ppid", str(self.process.pid)],
+                              stdout=subprocess.PIPE)
+        return [int(pid) for pid in done.stdout.split()]
 
     def __exit__(self, *_):
         self.process.terminate()

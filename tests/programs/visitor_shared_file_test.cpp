@@ -5,6 +5,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <filesystem>
 #include <fstream>
 
 #include "support/child.h"
@@ -66,6 +67,19 @@ TEST_F(VisitorSharedFile, OnlyRegularFilesAreFiles) {
                            "/tmp/no-such-file", "/tmp/shared-file.txt/x"}) {
     EXPECT_EQ(Open(path), OpenResult::kGone) << path;
   }
+}
+
+TEST_F(VisitorSharedFile, FolderThatHasBecomeASymbolicLinkLeadsNowhere) {
+  std::filesystem::create_directories("/tmp/shared-real");
+  std::filesystem::remove("/tmp/shared-folder");
+  std::filesystem::create_directory_symlink("/tmp/shared-real", "/tmp/shared-folder");
+  std::ofstream("/tmp/shared-real/file") << "x";
+  EXPECT_EQ(Open("/tmp/shared-real/file"), OpenResult::kOpened);
+  EXPECT_EQ(Open("/tmp/shared-folder/file"), OpenResult::kGone);
+}
+
+TEST_F(VisitorSharedFile, DotsInAPathGoByItsText) {
+  EXPECT_EQ(Open("/tmp/../tmp/./shared-file.txt"), OpenResult::kOpened);
 }
 
 TEST_F(VisitorSharedFile, PathMustBeAbsoluteAndWhole) {

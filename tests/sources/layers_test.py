@@ -55,12 +55,18 @@ LAYERS = {
         "include/tuvosharing/tuvosharing.h",
         ["common", "rows", "connection", "record", "generic store", "database", "stores", "login"],
     ),
-    "programs": (
-        "programs/*",
-        ["platform", "common", "rows", "connection", "record", "generic store", "database",
-         "stores", "login", "everything"],
-    ),
 }
+
+# The programs know the library's public headers and what they share, never each other.
+LIBRARY = ["platform", "common", "rows", "connection", "record", "generic store", "database",
+           "stores", "login", "everything"]
+LAYERS["programs/common"] = ("programs/common/*", LIBRARY)
+LAYERS["programs/owner"] = ("programs/owner/*", LIBRARY + ["programs/common"])
+for program in ("visitor", "sharingurl", "demo"):
+    LAYERS["programs/" + program] = (f"programs/{program}/*", LIBRARY + ["programs/common"])
+for program in ("webapi", "cli"):
+    LAYERS["programs/" + program] = (f"programs/{program}/*",
+                                     LIBRARY + ["programs/common", "programs/owner"])
 
 # Who may call SQLite itself; all others go through the platform's database interface.
 SQLITE_USERS = ["platform/src/*", "db/base_db.cpp"]
@@ -93,6 +99,8 @@ def path_of(quote, name):
         return "include/" + name
     if name.startswith("tuvoplatform/"):
         return "platform/include/" + name
+    if quote == '"' and "programs/" + name.split("/")[0] in LAYERS and "/" in name:
+        return "programs/" + name
     return None
 
 
@@ -109,7 +117,7 @@ def complaint(path, quote, name):
     here, there = layer_of(path), layer_of(target)
     if there is None:
         return "is in no layer; add it to tests/sources/layers_test.py"
-    if here == "programs" and name.startswith("internal/"):
+    if here.startswith("programs/") and name.startswith("internal/"):
         return "is no public header"
     if there != here and there not in LAYERS[here][1]:
         return f"the layer '{here}' must not know the layer '{there}'"
@@ -130,6 +138,10 @@ FORBIDDEN = [
     ("programs/visitor/main.cpp", '"', "../../include/internal/log.h"),
     ("login/sharinglogin.cpp", "<", "sqlite3.h"),
     ("utils/log.cpp", "<", "internal/not_there.h"),
+    ("programs/webapi/main.cpp", '"', "cli/create.h"),
+    ("programs/visitor/main.cpp", '"', "owner/settings.h"),
+    ("programs/owner/account.cpp", '"', "webapi/handler.h"),
+    ("programs/common/gateway.cpp", '"', "visitor/route.h"),
 ]
 ALLOWED = [
     ("login/sharinglogin.cpp", "<", "tuvosharing/entry_db.h"),
@@ -137,6 +149,8 @@ ALLOWED = [
     ("db/base_db.cpp", "<", "sqlite3.h"),
     ("programs/visitor/main.cpp", "<", "tuvosharing/login.h"),
     ("programs/visitor/main.cpp", '"', "route.h"),
+    ("programs/visitor/main.cpp", '"', "common/gateway.h"),
+    ("programs/webapi/main.cpp", '"', "owner/settings.h"),
     ("record/entry.cpp", "<", "string"),
 ]
 

@@ -180,6 +180,28 @@ TEST_F(Webapi, NothingOfAnEarlierReplyIsLeft) {
   EXPECT_EQ(reply_.getMemberNames(), Texts{"b"});
 }
 
+TEST_F(Webapi, TheReplyMayBeTheParameters) {
+  tool_.Prints("{\"b\": 2}");
+  reply_ = Json::Value(Json::objectValue);
+  reply_["a"] = "1";
+  reply_["c"] = "3";
+  ASSERT_TRUE(Send(reply_));
+  Texts arguments = ToolArguments();
+  ASSERT_EQ(arguments.size(), 7U);
+  EXPECT_EQ(Texts(arguments.begin() + 5, arguments.end()), (Texts{"a=1", "c=3"}));
+  EXPECT_EQ(reply_.getMemberNames(), Texts{"b"});
+}
+
+TEST_F(Webapi, TheParametersMayBeAPartOfTheReply) {
+  tool_.Prints("{\"b\": 2}");
+  const std::string text(100, 'x');  // one that lies on the heap
+  reply_ = Json::Value(Json::objectValue);
+  reply_["data"]["links"][0]["a"] = text;
+  ASSERT_TRUE(Send(reply_["data"]["links"][0]));
+  EXPECT_EQ(ToolArguments().back(), "a=" + text);
+  EXPECT_EQ(reply_.getMemberNames(), Texts{"b"});
+}
+
 TEST_F(Webapi, WithoutAToolItFails) {
   EXPECT_FALSE(Send());
   EXPECT_EQ(reply_, kEmptyObject);
@@ -350,6 +372,31 @@ TEST(WebapiWithoutMemory, WhatIsRaisedLeavesNoChildAndNoDescriptorEither) {
   }
   EXPECT_TRUE(done);
   EXPECT_GT(raised_while_it_ran, 0);
+}
+
+// Its first member is there before the others find no memory.
+TEST(WebapiWithoutMemory, AReplyThatDoesNotFitIsNotTakenForOneThatCannotBeRead) {
+  Tool tool("/usr/tuvo/bin/tuvowebapi");
+  tool.Prints("{\"first\": 1, \"second\": [1, 2, 3, 4, 5, 6, 7, 8, 9, 10]}");
+  const Json::Value params = kEmptyObject;
+  int raised_while_reading = 0;
+  bool done = false;
+  for (long allowed = 0; !done && allowed < 1000; ++allowed) {
+    Json::Value reply;
+    tuvo_test::allocations_left = allowed;
+    try {
+      done = SendWebapi(reply, "A", 1, "m", params);
+      const bool refused = tuvo_test::allocations_left < 0;
+      tuvo_test::allocations_left = -1;
+      EXPECT_TRUE(done || !reply.isMember("first")) << "allocation " << allowed;
+      done = done && !refused;
+    } catch (const std::bad_alloc&) {
+      tuvo_test::allocations_left = -1;
+      raised_while_reading += reply.isMember("first") ? 1 : 0;
+    }
+  }
+  EXPECT_TRUE(done);
+  EXPECT_GT(raised_while_reading, 0);
 }
 
 }  // namespace

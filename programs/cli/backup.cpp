@@ -1,0 +1,96 @@
+// tuvosharing backup
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <tuvoplatform/database.h>
+#include <tuvosharing/keys.h>
+#include <unistd.h>
+
+#include <cstdlib>
+#include <memory>
+
+#include "cli/caller_file.h"
+#include "cli/commands.h"
+#include "cli/failure.h"
+#include "cli/interrupt.h"
+#include "cli/progress.h"
+#include "common/stream.h"
+
+namespace cli {
+
+namespace {
+
+struct CloseDb {
+  void operator()(TUVODB* db) const { TUVODBClose(db); }
+};
+using Db = std::unique_ptr<TUVODB, CloseDb>;
+
+std::string FolderOf(const std::string& path) {
+  return path.substr(0, path.rfind('/'));
+}
+
+// A folder beside the database that nobody else can look into, gone with what is in it at the end.
+// The copy is made there by the system account: what it reads with, it must also own, and the
+// caller's folder is not its to write to.
+class CopyPlace {
+ public:
+  explicit CopyPlace(const std::string& beside) : folder_(FolderOf(beside) + "/backup.XXXXXX") {
+    if (mkdtemp(folder_.data()) == nullptr) {
+      throw SystemFailure(FolderOf(beside));
+    }
+  }
+  ~CopyPlace() {
+    (void)unlink(Path().c_str());
+    (void)rmdir(folder_.c_str());
+  }
+  CopyPlace(const CopyPlace&) = delete;
+  CopyPlace& operator=(const CopyPlace&) = delete;
+
+  std::string Path() const { return folder_ + "/copy.db"; }
+
+ private:
+  std::string folder_;
+};
+
+// Another answer than 0 ends the copying.
+int ShowProgress(void* context, unsigned int left, unsigned int total) {
+  auto* progress = static_cast<Progress*>(context);
+  progress->SetTotal(total);
+  progress->Show(total - left);
+  return NotedSignal();
+}
+
+void CopyDatabase(const std::string& from, const std::string& to) {
+  struct stat st {};
+  if (stat(from.c_str(), &st) != 0) {  // connecting would create one
+    throw SystemFailure("the database cannot be read");
+  }
+  const Db db(TUVODBConnect("", "", "", from.c_str()));
+  Progress progress("pages copied", 0);
+  if (!db || TUVODBBackup(db.get(), to.c_str(), ShowProgress, &progress) != 0) {
+    StopIfInterrupted();
+    throw Failure(ExitStatus::kFailed,
+                  std::string("the database cannot be copied: ") + TUVODBErrorGet(db.get()));
+  }
+}
+
+void HandOver(const std::string& copy, int to) {
+  const common::UniqueFd from(open(copy.c_str(), O_RDONLY | O_CLOEXEC | O_NOFOLLOW));
+  struct stat st {};
+  if (from.get() < 0 || fstat(from.get(), &st) != 0 ||
+      !common::CopyAll(from.get(), 0, st.st_size, to)) {
+    throw SystemFailure("the copy cannot be written");
+  }
+}
+
+}  // namespace
+
+ExitStatus Backup(const BackupOptions& options) {
+  NewFile file(options.file, options.force);
+  const CopyPlace place(TUVO::sharing::SZF_SHARING_DB_PATH);
+  CopyDatabase(TUVO::sharing::SZF_SHARING_DB_PATH, place.Path());
+  HandOver(place.Path(), file.fd());
+  file.Keep();
+  return ExitStatus::kDone;
+}
+
+}  // namespace cli

@@ -1,0 +1,69 @@
+// tuvosharing create
+#include <tuvosharing/keys.h>
+#include <unistd.h>
+
+#include <ctime>
+#include <iostream>
+
+#include "cli/change_log.h"
+#include "cli/commands.h"
+#include "cli/database.h"
+#include "cli/display.h"
+#include "cli/failure.h"
+#include "cli/output.h"
+#include "common/config.h"
+#include "owner/link_store.h"
+
+namespace cli {
+
+namespace {
+
+using TUVO::sharing::record::Entry;
+
+owner::MaybeProblem MakeLink(const GivenSettings& given, std::time_t now, Entry* link) {
+  link->set_owner_uid(getuid());
+  link->set_app(Json::Value(Json::objectValue));
+  if (owner::MaybeProblem problem =
+          ApplyGivenSettings(given, common::ReadConfig().share_folders, link)) {
+    return problem;
+  }
+  if (link->get_expire_at() != 0 && link->get_expire_at() <= now) {
+    return owner::Fault(owner::Error::kBadValue, "must lie in the future",
+                        TUVO::sharing::SZK_EXPIRE_AT);
+  }
+  return owner::CreateLink(Database(), link);
+}
+
+void Print(const Entry& link, const CreateOptions& options, std::time_t now) {
+  if (options.quiet) {
+    std::cout << link.get_hash() << '\n';
+    return;
+  }
+  const Json::Value json = LinkWithAddress(link, now);
+  if (options.json) {
+    PrintJson(json);
+    return;
+  }
+  std::cout << link.get_hash() << '\n';
+  if (json["url"].asString().empty()) {
+    Complain("the link is made; its address is not known (the system log says why)");
+  } else {
+    std::cout << Harmless(json["url"].asString()) << '\n';
+  }
+}
+
+}  // namespace
+
+ExitStatus Create(const CreateOptions& options) {
+  const std::time_t now = std::time(nullptr);
+  const GivenSettings given =
+      ReadGivenSettings(options.settings, TUVO::sharing::SZK_PROJECT_NAME, now);
+  Entry link;
+  const owner::MaybeProblem problem = MakeLink(given, now, &link);
+  LogChange("create", problem ? 0 : link.get_id(), problem);
+  Require(problem);
+  Print(link, options, now);
+  return ExitStatus::kDone;
+}
+
+}  // namespace cli

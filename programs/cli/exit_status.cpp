@@ -1,0 +1,24 @@
+#include "cli/exit_status.h"
+
+namespace cli {
+
+ExitStatus StatusOf(owner::Error error) {
+  switch (error) {
+    case owner::Error::kInternal:
+      return ExitStatus::kFailed;
+    case owner::Error::kNoSuchLink:
+      return ExitStatus::kNoSuchLink;
+    case owner::Error::kHashTaken:
+      return ExitStatus::kTaken;
+    case owner::Error::kForbidden:
+    case owner::Error::kFileNotAllowed:
+    case owner::Error::kNoAccount:
+      return ExitStatus::kNotAllowed;
+    case owner::Error::kBusy:
+      return ExitStatus::kBusy;
+    default:
+      return ExitStatus::kUsage;
+  }
+}
+
+}  // namespace cli

@@ -1,0 +1,30 @@
+// Signals that end the command where it can take back what it has begun.
+#ifndef PROGRAMS_CLI_INTERRUPT_H_
+#define PROGRAMS_CLI_INTERRUPT_H_
+
+#include <exception>
+
+namespace cli {
+
+// From now on the first SIGINT, SIGQUIT, SIGTERM or SIGHUP (one that is ignored stays so) is noted,
+// and system calls that wait are ended by it; the second one ends the process.
+void NoteSignals();
+
+// The signal that came; 0 when none did.
+int NotedSignal();
+
+class Interruption : public std::exception {};
+
+// Throws Interruption when a signal came.
+void StopIfInterrupted();
+
+// Waits until `fd` can be read, or is at its end, or broken. Throws Interruption when a signal
+// came: one that comes right before the waiting is not missed either.
+void WaitForInput(int fd);
+
+// Ends the process by that signal, as it would have ended without NoteSignals.
+[[noreturn]] void EndBySignal(int signal);
+
+}  // namespace cli
+
+#endif  // PROGRAMS_CLI_INTERRUPT_H_

@@ -1,0 +1,25 @@
+// What the commands print.
+#ifndef PROGRAMS_CLI_OUTPUT_H_
+#define PROGRAMS_CLI_OUTPUT_H_
+
+#include <json/value.h>
+#include <tuvosharing/entry.h>
+
+#include <ctime>
+#include <string>
+
+namespace cli {
+
+// One line of JSON on standard output.
+void PrintJson(const Json::Value& value);
+std::string JsonLine(const Json::Value& value);
+
+// One line on standard error: "tuvosharing: " and the text.
+void Complain(const std::string& text);
+
+// The link's object with its address, "url" and "url_type".
+Json::Value LinkWithAddress(const TUVO::sharing::record::Entry& link, std::time_t now);
+
+}  // namespace cli
+
+#endif  // PROGRAMS_CLI_OUTPUT_H_

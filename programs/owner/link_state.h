@@ -1,0 +1,28 @@
+// Where a link stands in its life.
+#ifndef PROGRAMS_OWNER_LINK_STATE_H_
+#define PROGRAMS_OWNER_LINK_STATE_H_
+
+#include <tuvosharing/entry.h>
+
+#include <ctime>
+#include <optional>
+#include <string>
+#include <string_view>
+
+namespace owner {
+
+// Several may apply; a link's state is the first of them in this order. Only kLive admits visitors.
+enum class LinkState { kDisabled, kExpired, kUsedUp, kNotYet, kLive };
+
+LinkState StateOf(const TUVO::sharing::record::Entry& link, std::time_t now);
+
+// "disabled", "expired", "used_up", "not_yet", "live".
+std::string StateText(LinkState state);
+std::optional<LinkState> StateOfText(std::string_view text);
+
+// The condition, in parentheses, that exactly the rows of that state meet.
+std::string StateClause(LinkState state, std::time_t now);
+
+}  // namespace owner
+
+#endif  // PROGRAMS_OWNER_LINK_STATE_H_

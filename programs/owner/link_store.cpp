@@ -1,0 +1,136 @@
+#include "owner/link_store.h"
+
+#include <tuvosharing/entry_db.h>
+#include <tuvosharing/result.h>
+#include <tuvosharing/row.h>
+
+#include "owner/transaction.h"
+
+namespace owner {
+
+namespace {
+
+using TUVO::sharing::db::BaseDB;
+using TUVO::sharing::db::EntryDB;
+using TUVO::sharing::db::Result;
+using TUVO::sharing::db::Row;
+using TUVO::sharing::record::Entry;
+
+constexpr unsigned int kAnyOwner = 4294967295U;
+
+MaybeProblem NoSuchLink() {
+  return Fault(Error::kNoSuchLink, "there is no such link");
+}
+
+// Read here and not by the store's look-ups, which answer the same for a statement that failed and
+// for a link that is not there.
+MaybeProblem Load(BaseDB& db, const std::string& clause, Entry* link) {
+  *link = Entry();
+  Result result;
+  Row row;
+  if (!db.Execute("SELECT * FROM entry WHERE " + clause, result)) {
+    return InternalFault();
+  }
+  if (result.NextRow(row) && link->FromRow(row)) {
+    return std::nullopt;
+  }
+  return NoSuchLink();
+}
+
+MaybeProblem Find(BaseDB& db, const LinkName& name, Scope scope, Entry* link) {
+  const std::string clause =
+      name.id != 0 ? "id = " + std::to_string(name.id) : "hash = '" + db.Escape(name.hash) + "'";
+  if (MaybeProblem problem = Load(db, clause, link)) {
+    return problem;
+  }
+  return scope && link->get_owner_uid() != *scope ? NoSuchLink() : std::nullopt;
+}
+
+// Whether another link than `id` has the hash; rows that do not load as a link count.
+MaybeProblem CheckHashFree(BaseDB& db, const std::string& hash, int id) {
+  Result result;
+  Row row;
+  if (!db.Execute("SELECT id FROM entry WHERE hash = '" + db.Escape(hash) +
+                      "' AND id != " + std::to_string(id),
+                  result)) {
+    return InternalFault();
+  }
+  return result.NextRow(row) ? Fault(Error::kHashTaken, "is taken by another link", "hash")
+                             : std::nullopt;
+}
+
+MaybeProblem Purge(BaseDB& db, EntryDB& links, Scope scope, const std::string& project,
+                   int* deleted) {
+  Result result;
+  Row row;
+  if (!links.PurgeExpiredByOwnerProject(scope.value_or(kAnyOwner), project) ||
+      !db.Execute("SELECT changes() AS c", result) || !result.NextRow(row)) {
+    return InternalFault();
+  }
+  *deleted = row.GetField("c").AsInt(0);
+  return std::nullopt;
+}
+
+}  // namespace
+
+MaybeProblem CreateLink(BaseDB& db, Entry* link) {
+  if (link->get_hash().empty()) {
+    return EntryDB(db).CreateWithHash(*link) ? std::nullopt : InternalFault();
+  }
+  return InTransaction(db, [&db, link](EntryDB& links) {
+    if (MaybeProblem problem = CheckHashFree(db, link->get_hash(), 0)) {
+      return problem;
+    }
+    return links.Create(*link) ? std::nullopt : InternalFault();
+  });
+}
+
+MaybeProblem FindLink(BaseDB& db, const LinkName& name, Scope scope, Entry* link) {
+  return Find(db, name, scope, link);
+}
+
+MaybeProblem ChangeLink(BaseDB& db, const LinkName& name, Scope scope,
+                        const std::function<MaybeProblem(Entry*)>& change, Entry* link) {
+  return InTransaction(db, [&](EntryDB& links) {
+    MaybeProblem problem = Find(db, name, scope, link);
+    if (problem) {
+      return problem;
+    }
+    const std::string hash = link->get_hash();
+    problem = change(link);
+    if (!problem && link->get_hash() != hash) {
+      problem = CheckHashFree(db, link->get_hash(), link->get_id());
+    }
+    if (!problem && !links.Update(*link)) {
+      problem = InternalFault();
+    }
+    return problem;
+  });
+}
+
+MaybeProblem DeleteLink(BaseDB& db, const LinkName& name, Scope scope, Entry* link) {
+  return InTransaction(db, [&](EntryDB& links) {
+    if (MaybeProblem problem = Find(db, name, scope, link)) {
+      return problem;
+    }
+    return links.Delete(*link) ? std::nullopt : InternalFault();
+  });
+}
+
+MaybeProblem DeleteExpiredLinks(BaseDB& db, Scope scope, const std::string& project, int* deleted) {
+  return InTransaction(db,
+                       [&](EntryDB& links) { return Purge(db, links, scope, project, deleted); });
+}
+
+// The very deletion, taken back: only that counts exactly what it would delete.
+MaybeProblem CountExpiredLinks(BaseDB& db, Scope scope, const std::string& project, int* count) {
+  bool counted = false;
+  const MaybeProblem problem = InTransaction(db, [&](EntryDB& links) {
+    MaybeProblem fault = Purge(db, links, scope, project, count);
+    counted = !fault;
+    return fault ? fault : Fault(Error::kConflict, "only counted");
+  });
+  return counted ? std::nullopt : problem;
+}
+
+}  // namespace owner

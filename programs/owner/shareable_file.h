@@ -1,0 +1,30 @@
+// Whether an owner may share a file.
+#ifndef PROGRAMS_OWNER_SHAREABLE_FILE_H_
+#define PROGRAMS_OWNER_SHAREABLE_FILE_H_
+
+#include <string>
+#include <vector>
+
+#include "owner/account.h"
+
+namespace owner {
+
+enum class FileAnswer {
+  kMay,
+  kNotReadable,  // not there, no regular file, or the owner's account may not read it
+  kOutside,      // below none of the folders
+  kCannotTell,   // this process cannot take the owner's identity (logged)
+};
+
+// Looks at `path` with the ids and groups of `owner`, in a child process: the answer is the
+// kernel's own, access lists and the like included. `resolved` is the file's path without symbolic
+// links and "..", as the kernel has it for the file that was looked at, and is set with kMay alone.
+// A process that cannot become somebody else (root is none of its ids) can tell for its own user
+// only. A folder that does not exist admits nothing. Makes and reaps a child; forbidden while
+// another thread runs.
+FileAnswer CheckShareable(const std::string& path, const Account& owner,
+                          const std::vector<std::string>& folders, std::string* resolved);
+
+}  // namespace owner
+
+#endif  // PROGRAMS_OWNER_SHAREABLE_FILE_H_

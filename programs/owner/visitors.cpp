@@ -1,0 +1,63 @@
+#include "owner/visitors.h"
+
+#include <tuvosharing/condition.h>
+#include <tuvosharing/keys.h>
+#include <tuvosharing/session_db.h>
+#include <tuvosharing/token_db.h>
+#include <tuvosharing/user_group.h>
+
+namespace owner {
+
+namespace {
+
+using TUVO::sharing::db::BaseDB;
+using TUVO::sharing::db::Condition;
+using TUVO::sharing::db::SessionDB;
+using TUVO::sharing::db::TokenDB;
+using TUVO::sharing::record::Entry;
+using TUVO::sharing::record::Session;
+using TUVO::sharing::record::Token;
+
+void OfLink(const Entry& link, std::time_t now, Condition* condition) {
+  condition->Where(TUVO::sharing::SZK_ENTRY_ID, std::to_string(link.get_id()));
+  condition->Where("timeout >= " + std::to_string(now));
+}
+
+Visitor VisitorOf(const Session& session, const Token& token) {
+  Visitor visitor;
+  visitor.ip = session.get_ip();
+  visitor.expires_at = token.get_timeout();
+  std::string name;
+  if (TUVO::sharing::UIDToUser(session.get_uid(), name)) {
+    visitor.user = name;
+  }
+  return visitor;
+}
+
+}  // namespace
+
+MaybeProblem ListVisitors(BaseDB& db, const Entry& link, int most, std::time_t now,
+                          std::vector<Visitor>* visitors, int* total) {
+  const TokenDB tokens(db);
+  OfLink(link, now, &tokens.GetCondition());
+  if (!tokens.Count(*total)) {
+    return InternalFault();
+  }
+  OfLink(link, now, &tokens.GetCondition());
+  tokens.GetCondition().OrderBy(TUVO::sharing::SZK_TIMEOUT, false);
+  tokens.GetCondition().Limit(0, most);
+  std::vector<Token> found;
+  if (!tokens.Query(found)) {
+    return InternalFault();
+  }
+  const SessionDB sessions(db);
+  for (const Token& token : found) {
+    Session session;
+    if (sessions.GetById(token.get_session_id(), session)) {
+      visitors->push_back(VisitorOf(session, token));
+    }
+  }
+  return std::nullopt;
+}
+
+}  // namespace owner

@@ -1,0 +1,164 @@
+// The dialogs about one link, and the questions. All are <dialog> elements shown as modal: the
+// browser keeps the focus inside and closes them with Escape.
+
+import * as api from "./api.js";
+import * as clock from "./clock.js";
+import {byId, element, isUsable, say, setUsable} from "./dom.js";
+import * as texts from "./texts.js";
+
+// `comeBack` puts the focus where it belongs once the dialog is closed; without it the browser
+// gives it back to the element that had it.
+export function open(dialog, comeBack = undefined) {
+  dialog.addEventListener("close", () => comeBack?.(), {once: true});
+  dialog.showModal();
+}
+
+export function start() {
+  for (const button of document.querySelectorAll("dialog [data-close]")) {
+    button.addEventListener("click", () => button.closest("dialog").close());
+  }
+  byId("copy-address").addEventListener("click", copyShownAddress);
+  byId("address").addEventListener("focus", () => byId("address").select());
+}
+
+// ---- the address ----
+
+// The server's own answer, or, where it does not know its name, what this page's address suggests.
+export const addressOf = (answer) =>
+    answer.url || new URL("/sharing/" + answer.link.hash, location.origin).href;
+
+const guessed = (answer) => answer.url
+    ? ""
+    : "The server does not know its own address; this one is made from the address of this page.";
+
+// Puts the text that a promise ends with into the clipboard; false where the browser does not allow
+// it, as on pages that came without HTTPS. The clipboard gets the promise, because some browsers
+// allow this only while a button is being pressed.
+export async function copy(promise) {
+  const blob = promise.then((text) => new Blob([text], {type: "text/plain"}));
+  blob.catch(() => {}); // is met below
+  try {
+    await navigator.clipboard.write([new ClipboardItem({"text/plain": blob})]);
+    return true;
+  } catch {
+    // Older browsers take no promise.
+  }
+  const text = await promise;
+  try {
+    await navigator.clipboard.writeText(text);
+    return true;
+  } catch {
+    return false;
+  }
+}
+
+async function copyShownAddress() {
+  const field = byId("address");
+  const copied = await copy(Promise.resolve(field.value));
+  if (copied) {
+    byId("address-status").textContent = "The address is copied.";
+    return;
+  }
+  field.focus();
+  field.select();
+  byId("address-status").textContent = "The browser does not let this page copy. The address is \
+selected: copy it with the keyboard (Ctrl+C) or the context menu.";
+}
+
+// Shows the address of a link, from an answer of the methods create, get and set.
+export function showAddress(answer, {heading, status = "", selected = false, comeBack}) {
+  byId("address-heading").textContent = heading;
+  byId("address").value = addressOf(answer);
+  byId("address-status").textContent = status;
+  say(byId("address-note"), guessed(answer));
+  showQr(answer);
+  open(byId("address-dialog"), comeBack);
+  if (selected) {
+    byId("address").focus();
+  }
+}
+
+// As an image, where nothing that a text from elsewhere might hold can run.
+function showQr(answer) {
+  const image = byId("qr");
+  const svg = answer.qr_svg ?? "";
+  image.hidden = svg === "";
+  byId("no-qr").hidden = svg !== "";
+  if (svg === "") {
+    image.removeAttribute("src");
+    return;
+  }
+  image.src = "data:image/svg+xml;charset=utf-8," + encodeURIComponent(svg);
+  image.alt = "QR code of the address " + addressOf(answer);
+}
+
+// ---- the visitors ----
+
+export async function showVisitors(link, comeBack) {
+  const rows = byId("visitors-rows");
+  rows.replaceChildren();
+  byId("visitors-scroll").hidden = true;
+  byId("visitors-heading").textContent = "Visitors of " + texts.linkName(link);
+  byId("visitors-count").textContent = "Loading…";
+  open(byId("visitors-dialog"), comeBack);
+  try {
+    const answer = await api.link("sessions", {id: link.id});
+    byId("visitors-scroll").hidden = answer.sessions.length === 0;
+    rows.replaceChildren(...answer.sessions.map(visitorRow));
+    byId("visitors-count").textContent = visitorsCount(answer);
+  } catch (error) {
+    byId("visitors-count").textContent = texts.describe(error);
+  }
+}
+
+function visitorRow(session) {
+  const cell = (text) => element("td", {role: "cell", class: "wraps"}, text);
+  return element("tr", {role: "row"},
+                 element("th", {role: "rowheader", scope: "row"}, session.user || "A stranger"),
+                 cell(session.ip), cell(clock.shown(session.expires_at)));
+}
+
+function visitorsCount(answer) {
+  if (answer.total === 0) {
+    return "Nobody is admitted now.";
+  }
+  const all = texts.plural(answer.total, "visitor is", "visitors are") + " admitted now";
+  return answer.total > answer.sessions.length
+      ? `${all}; the ${answer.sessions.length} that stay longest are shown.`
+      : all + ".";
+}
+
+// ---- questions ----
+
+// Asks before something that cannot be taken back. `act` does it and may fail; the dialog stays
+// open then, and says why.
+export function ask({heading, text, yes, act, comeBack}) {
+  const dialog = byId("question-dialog");
+  const button = byId("question-yes");
+  byId("question-heading").textContent = heading;
+  byId("question-text").textContent = text;
+  say(byId("question-problem"), "");
+  button.textContent = yes;
+  setUsable(button, true);
+  button.onclick = () => attempt(dialog, button, byId("question-problem"), act);
+  open(dialog, comeBack);
+}
+
+// Does what a dialog's button is for and closes the dialog; when it fails the dialog says why. What
+// is to be said on the page comes in `after`: under an open dialog no screen reader hears it.
+export async function attempt(dialog, button, problem, act, after = () => {}) {
+  if (!isUsable(button)) {
+    return;
+  }
+  setUsable(button, false);
+  say(problem, "");
+  try {
+    const result = await act();
+    dialog.close();
+    after(result);
+  } catch (error) {
+    say(problem, texts.describe(error));
+  } finally {
+    setUsable(button, true);
+  }
+}

@@ -1,0 +1,75 @@
+// What the list shows: filters, order and page. Kept in the address's fragment, which a reload and
+// a bookmark keep, and which is never sent to the server.
+
+export const PAGE_SIZES = [25, 50, 100, 500];
+export const STATES = ["live", "not_yet", "disabled", "expired", "used_up"];
+export const SORTS = ["id", "project_name", "hash", "owner_uid", "use_count", "expire_at"];
+
+const DEFAULTS = {
+  search: "",
+  state: "",
+  project: "",
+  owner: "",
+  sort: "id",
+  descending: true,
+  page: 1,
+  size: 50,
+};
+export const FILTERS = ["search", "state", "project", "owner"];
+
+export const isFiltered = (view) => FILTERS.some((name) => view[name] !== "");
+
+// Anybody can write a fragment into a link to this page: what is not a choice of the page's is left
+// at its default.
+export function read(fragment) {
+  const given = new URLSearchParams(fragment.replace(/^#/, ""));
+  const oneOf = (name, choices, fallback) =>
+      choices.includes(given.get(name)) ? given.get(name) : fallback;
+  const page = /^[1-9][0-9]{0,5}$/.test(given.get("page") ?? "") ? Number(given.get("page")) : 1;
+  return {
+    search: given.get("search") ?? DEFAULTS.search,
+    state: oneOf("state", STATES, DEFAULTS.state),
+    project: given.get("project") ?? DEFAULTS.project,
+    owner: given.get("owner") ?? DEFAULTS.owner,
+    sort: oneOf("sort", SORTS, DEFAULTS.sort),
+    descending: oneOf("order", ["up", "down"], "down") === "down",
+    page,
+    size: Number(oneOf("size", PAGE_SIZES.map(String), String(DEFAULTS.size))),
+  };
+}
+
+export function write(view) {
+  const kept = new URLSearchParams();
+  for (const name of [...FILTERS, "sort", "page", "size"]) {
+    if (view[name] !== DEFAULTS[name]) {
+      kept.set(name, view[name]);
+    }
+  }
+  if (!view.descending) {
+    kept.set("order", "up");
+  }
+  const fragment = kept.toString();
+  history.replaceState(null, "", fragment ? "#" + fragment : location.pathname + location.search);
+}
+
+// The arguments of the API's method "list".
+export function query(view) {
+  const settings = {
+    offset: (view.page - 1) * view.size,
+    limit: view.size,
+    sort: view.sort,
+    descending: view.descending,
+  };
+  const filters = {
+    search: view.search,
+    state: view.state,
+    project_name: view.project,
+    owner_user: view.owner,
+  };
+  for (const [name, value] of Object.entries(filters)) {
+    if (value !== "") {
+      settings[name] = value;
+    }
+  }
+  return settings;
+}

@@ -1,0 +1,49 @@
+// What the web API offers.
+#ifndef PROGRAMS_WEBAPI_REGISTRY_H_
+#define PROGRAMS_WEBAPI_REGISTRY_H_
+
+#include <json/value.h>
+
+#include <ctime>
+#include <string>
+#include <vector>
+
+#include "owner/account.h"
+#include "owner/argument.h"
+#include "owner/problem.h"
+#include "webapi/call.h"
+
+namespace webapi {
+
+// What a method works with.
+struct Turn {
+  const owner::Account& account;
+  const Json::Value& arguments;  // checked against the method's list
+  const owner::ServerPlace& place;
+  std::time_t now;
+  Json::Value& data;  // the method's answer; an empty object at first
+  int& link;          // the row of the link that the method found or made, for the event log
+};
+
+struct Method {
+  const char* name;
+  bool changes;  // needs a POST, and leaves a line in the event log under its name
+  std::vector<owner::Argument> arguments;
+  owner::MaybeProblem (*run)(Turn* turn);
+};
+
+struct Api {
+  const char* name;
+  int min_version;
+  int max_version;
+  std::vector<Method> methods;
+};
+
+const std::vector<Api>& Apis();
+
+// The method that `call` names: checks the API, then the version, then the method.
+owner::MaybeProblem FindMethod(const Call& call, const Method** method);
+
+}  // namespace webapi
+
+#endif  // PROGRAMS_WEBAPI_REGISTRY_H_

@@ -1,0 +1,180 @@
+"""A real browser for the tests of the pages: Chromium in a profile of its own, driven through its
+driver. With TUVO_SCREENSHOTS set to a folder, pictures of pages are left there. To be imported in a
+test program, which it ends as skipped where there is no browser."""
+
+import json
+import os
+import shutil
+import socket
+import tempfile
+import time
+import urllib.parse
+
+import visitor_server as vs
+
+CHROMIUM = "/usr/bin/chromium"
+DRIVER = "/usr/bin/chromedriver"
+for needed, package in (CHROMIUM, "chromium"), (DRIVER, "chromium-driver"):
+    if not os.path.exists(needed):
+        vs.skip(f"the package {package} is missing")
+try:
+    from selenium import webdriver
+    from selenium.common.exceptions import WebDriverException
+    from selenium.webdriver.chrome.service import Service
+    from selenium.webdriver.common.by import By
+    from selenium.webdriver.common.keys import Keys  # pylint: disable=unused-import
+except ImportError:
+    vs.skip("the package python3-selenium is missing")
+
+# The browser and its driver talk to each other by that name.
+try:
+    socket.getaddrinfo("localhost", 80)
+except OSError:
+    vs.skip("the name localhost is not known here: no /etc/hosts")
+
+FLAGS = ("--headless", "--no-sandbox", "--disable-gpu", "--disable-quic", "--no-first-run",
+         "--disable-background-networking", "--disable-component-update", "--disable-sync",
+         "--host-resolver-rules=MAP * ~NOTFOUND, EXCLUDE 127.0.0.1", "--no-proxy-server",
+         "--window-size=800,640")
+PATIENCE = 20  # seconds
+
+
+class Browser:
+    """A browser with a fresh profile, from start() to quit()."""
+
+    def start(self):
+        self.profile = tempfile.mkdtemp()
+        self.downloads = os.path.join(self.profile, "downloads")
+        os.mkdir(self.downloads)
+        options = webdriver.ChromeOptions()
+        options.binary_location = CHROMIUM
+        for flag in FLAGS + ("--user-data-dir=" + self.profile,):
+            options.add_argument(flag)
+        options.add_experimental_option("prefs", {"download.default_directory": self.downloads,
+                                                  "download.prompt_for_download": False})
+        options.set_capability("goog:loggingPrefs", {"browser": "ALL", "performance": "ALL"})
+        try:
+            self.browser = webdriver.Chrome(service=Service(DRIVER), options=options)
+        except BaseException:
+            shutil.rmtree(self.profile, ignore_errors=True)
+            raise
+        self.browser.set_page_load_timeout(60)
+        self.browser.set_script_timeout(120)
+        return self
+
+    def quit(self):
+        self.browser.quit()
+        shutil.rmtree(self.profile, ignore_errors=True)
+
+    def __enter__(self):
+        return self.start()
+
+    def __exit__(self, *_):
+        self.quit()
+
+    def go(self, address):
+        self.browser.get(address)
+
+    # ---- looking ----
+
+    def wait_for(self, look, wanted):
+        """A pressed button or link returns before the next page is there."""
+        seen = None
+        end = time.monotonic() + PATIENCE
+        while time.monotonic() < end:
+            try:
+                seen = look()
+                if wanted(seen):
+                    return
+            except (WebDriverException, AssertionError) as missing:  # between two pages
+                seen = missing
+            time.sleep(0.05)
+        raise AssertionError(f"the browser ends up with: {seen}")
+
+    def text(self):
+        return self.browser.find_element(By.TAG_NAME, "main").text
+
+    def assert_heading(self, text):
+        self.wait_for(lambda: self.browser.find_element(By.TAG_NAME, "h1").text,
+                      lambda seen: seen == text)
+
+    def assert_says(self, text):
+        self.wait_for(self.text, lambda seen: text in seen)
+
+    def assert_arrives_at(self, address):
+        self.wait_for(lambda: self.browser.current_url, lambda seen: seen == address)
+
+    def field(self, label):
+        """By its label, as a person finds it: the one that is shown, and in front."""
+        dialogs = self.browser.find_elements(By.CSS_SELECTOR, "dialog[open]")
+        within = dialogs[-1] if dialogs else self.browser
+        for element in within.find_elements(By.XPATH, f".//label[normalize-space()='{label}']"):
+            if element.is_displayed():
+                identifier = element.get_attribute("for")
+                return (self.browser.find_element(By.ID, identifier) if identifier
+                        else element.find_element(By.TAG_NAME, "input"))
+        raise AssertionError(f"no field is labelled: {label}")
+
+    def has_focus(self, element):
+        return self.browser.switch_to.active_element == element
+
+    def style(self, selector, name):
+        return self.browser.execute_script(
+            "return getComputedStyle(document.querySelector(arguments[0]))[arguments[1]]",
+            selector, name)
+
+    def fits_width(self):
+        """Nothing has to be scrolled sideways."""
+        return self.browser.execute_script(
+            "return document.documentElement.scrollWidth <= window.innerWidth")
+
+    def policy_complaints(self):
+        """What the pages' Content-Security-Policy refused since this was last asked."""
+        return [entry["message"] for entry in self.browser.get_log("browser")
+                if "Security Policy" in entry["message"]]
+
+    def hosts(self):
+        """The hosts that anything was asked of since this was last asked."""
+        found = set()
+        for entry in self.browser.get_log("performance"):
+            message = json.loads(entry["message"])["message"]
+            if message["method"] == "Network.requestWillBeSent":
+                address = urllib.parse.urlsplit(message["params"]["request"]["url"])
+                if address.scheme not in ("data", "blob", "chrome", "devtools"):
+                    found.add(f"{address.hostname}:{address.port}")
+        return found
+
+    # ---- doing ----
+
+    def press(self, button):
+        self.browser.find_element(By.XPATH, f"//button[.='{button}']").click()
+
+    def picture(self, name):
+        folder = os.environ.get("TUVO_SCREENSHOTS")
+        if folder:
+            self.browser.save_screenshot(os.path.join(folder, name + ".png"))
+
+    def downloaded(self):
+        """Name and content of the file that the browser was sent."""
+        for _ in range(200):
+            names = os.listdir(self.downloads)
+            # The browser writes under a hidden name, then under one of its own, before the file's.
+            if names and not any(name.startswith(".") or name.endswith(".crdownload")
+                                 for name in names):
+                path = os.path.join(self.downloads, names[0])
+                with open(path, "rb") as file:
+                    content = file.read()
+                os.unlink(path)
+                return names[0], content
+            time.sleep(0.05)
+        raise AssertionError("nothing was downloaded; the page says: " + self.text())
+
+    def set_scheme(self, scheme):
+        """"light" or "dark", as the person's desktop would say."""
+        self.browser.execute_cdp_cmd("Emulation.setEmulatedMedia", {
+            "features": [{"name": "prefers-color-scheme", "value": scheme}]})
+
+    def set_size(self, width, height):
+        """Of the page itself; narrower than the windows that the browser opens."""
+        self.browser.execute_cdp_cmd("Emulation.setDeviceMetricsOverride", {
+            "width": width, "height": height, "deviceScaleFactor": 1, "mobile": False})

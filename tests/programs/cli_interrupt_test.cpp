@@ -1,0 +1,101 @@
+#include "cli/interrupt.h"
+
+#include <gtest/gtest.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <csignal>
+
+#include "support/child.h"
+
+namespace cli {
+namespace {
+
+constexpr int kSignalled = 256;  // and the signal: RunInChild
+
+// Both ends of a pipe that nobody writes to.
+struct Pipe {
+  Pipe() { EXPECT_EQ(pipe(ends), 0); }
+  int ends[2] = {-1, -1};
+};
+
+TEST(CliInterrupt, SignalIsNotedAndStopsTheCommand) {
+  const int status = tuvo_test::RunInChild([] {
+    NoteSignals();
+    StopIfInterrupted();
+    (void)raise(SIGTERM);
+    EXPECT_EQ(NotedSignal(), SIGTERM);
+    EXPECT_THROW(StopIfInterrupted(), Interruption);
+    return 0;
+  });
+  EXPECT_EQ(status, 0);
+}
+
+TEST(CliInterrupt, SecondSignalEndsTheProcess) {
+  const int status = tuvo_test::RunInChild([] {
+    NoteSignals();
+    (void)raise(SIGINT);
+    (void)raise(SIGINT);
+    return 0;
+  });
+  EXPECT_EQ(status, kSignalled + SIGINT);
+}
+
+TEST(CliInterrupt, SignalThatIsIgnoredStaysSo) {
+  const int status = tuvo_test::RunInChild([] {
+    (void)std::signal(SIGHUP, SIG_IGN);
+    NoteSignals();
+    (void)raise(SIGHUP);
+    return NotedSignal();
+  });
+  EXPECT_EQ(status, 0);
+}
+
+TEST(CliInterrupt, ProcessEndsByItsSignal) {
+  EXPECT_EQ(tuvo_test::RunInChild([]() -> int {
+              NoteSignals();
+              EndBySignal(SIGTERM);
+            }),
+            kSignalled + SIGTERM);
+}
+
+TEST(CliInterrupt, SignalRightBeforeTheWaitingIsNotMissed) {
+  const int status = tuvo_test::RunInChild([] {
+    NoteSignals();
+    const Pipe empty;
+    (void)raise(SIGTERM);
+    EXPECT_THROW(WaitForInput(empty.ends[0]), Interruption);
+    return 0;
+  });
+  EXPECT_EQ(status, 0);
+}
+
+TEST(CliInterrupt, SignalEndsTheWaiting) {
+  const int status = tuvo_test::RunInChild([] {
+    NoteSignals();
+    const Pipe empty;
+    const pid_t parent = getpid();
+    const pid_t child = fork();
+    if (child == 0) {
+      usleep(200000);
+      (void)kill(parent, SIGHUP);
+      _exit(0);
+    }
+    EXPECT_THROW(WaitForInput(empty.ends[0]), Interruption);
+    EXPECT_EQ(waitpid(child, nullptr, 0), child);
+    return 0;
+  });
+  EXPECT_EQ(status, 0);
+}
+
+TEST(CliInterrupt, InputAndItsEndEndTheWaiting) {
+  const Pipe pipe;
+  ASSERT_EQ(write(pipe.ends[1], "x", 1), 1);
+  WaitForInput(pipe.ends[0]);
+  const Pipe closed;
+  close(closed.ends[1]);
+  WaitForInput(closed.ends[0]);
+}
+
+}  // namespace
+}  // namespace cli

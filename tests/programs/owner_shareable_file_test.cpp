@@ -1,0 +1,193 @@
+#include "owner/shareable_file.h"
+
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <filesystem>
+#include <fstream>
+
+#include "support/child.h"
+#include "support/syslog_listener.h"
+
+namespace owner {
+namespace {
+
+namespace fs = std::filesystem;
+
+const Account kAlice{2001, "alice", false};
+const Account kBob{2002, "bob", false};
+
+// /tmp/share is the one folder that may be shared from.
+class OwnerShareableFile : public testing::Test {
+ protected:
+  void SetUp() override {
+    fs::create_directories("/tmp/share/sub");
+    fs::create_directories("/tmp/outside");
+    Make("/tmp/share/alices", 2001, 0600);
+    Make("/tmp/share/open", 0, 0644);
+    Make("/tmp/share/sub/friends", 0, 0640, 3001);
+    Make("/tmp/outside/open", 0, 0644);
+  }
+  void TearDown() override {
+    fs::remove_all("/tmp/share");
+    fs::remove_all("/tmp/outside");
+  }
+
+  static void Make(const std::string& path, uid_t uid, mode_t mode, gid_t gid = 0) {
+    std::ofstream(path) << "x";
+    ASSERT_EQ(chown(path.c_str(), uid, gid), 0);
+    ASSERT_EQ(chmod(path.c_str(), mode), 0);
+  }
+
+  FileAnswer Check(const std::string& path, const Account& owner = kAlice) {
+    resolved_.clear();
+    return CheckShareable(path, owner, folders_, &resolved_);
+  }
+
+  std::vector<std::string> folders_ = {"/tmp/share"};
+  std::string resolved_;
+};
+
+TEST_F(OwnerShareableFile, OwnersOwnFileMay) {
+  EXPECT_EQ(Check("/tmp/share/alices"), FileAnswer::kMay);
+  EXPECT_EQ(resolved_, "/tmp/share/alices");
+}
+
+TEST_F(OwnerShareableFile, SomebodyElsesPrivateFileMayNot) {
+  EXPECT_EQ(Check("/tmp/share/alices", kBob), FileAnswer::kNotReadable);
+  EXPECT_EQ(resolved_, "");
+}
+
+TEST_F(OwnerShareableFile, FileOfAGroupOfTheOwnerMay) {
+  EXPECT_EQ(Check("/tmp/share/sub/friends"), FileAnswer::kMay);
+  EXPECT_EQ(Check("/tmp/share/sub/friends", kBob), FileAnswer::kNotReadable);
+}
+
+TEST_F(OwnerShareableFile, FileOutsideOfTheFoldersMayNot) {
+  EXPECT_EQ(Check("/tmp/outside/open"), FileAnswer::kOutside);
+  EXPECT_EQ(resolved_, "");
+}
+
+TEST_F(OwnerShareableFile, FolderThatBeginsAlikeIsOutside) {
+  fs::create_directories("/tmp/share2");
+  Make("/tmp/share2/open", 0, 0644);
+  EXPECT_EQ(Check("/tmp/share2/open"), FileAnswer::kOutside);
+  fs::remove_all("/tmp/share2");
+}
+
+TEST_F(OwnerShareableFile, DotsAreResolved) {
+  EXPECT_EQ(Check("/tmp/share/sub/../open"), FileAnswer::kMay);
+  EXPECT_EQ(resolved_, "/tmp/share/open");
+  EXPECT_EQ(Check("/tmp/share/../outside/open"), FileAnswer::kOutside);
+}
+
+TEST_F(OwnerShareableFile, LinkWithinTheFolderIsResolved) {
+  fs::create_symlink("open", "/tmp/share/link");
+  EXPECT_EQ(Check("/tmp/share/link"), FileAnswer::kMay);
+  EXPECT_EQ(resolved_, "/tmp/share/open");
+}
+
+TEST_F(OwnerShareableFile, LinkThatLeadsOutsideMayNot) {
+  fs::create_symlink("/tmp/outside/open", "/tmp/share/link");
+  EXPECT_EQ(Check("/tmp/share/link"), FileAnswer::kOutside);
+  fs::create_directory_symlink("/tmp/outside", "/tmp/share/folder");
+  EXPECT_EQ(Check("/tmp/share/folder/open"), FileAnswer::kOutside);
+}
+
+TEST_F(OwnerShareableFile, LinkFromOutsideIntoTheFolderMay) {
+  fs::create_symlink("/tmp/share/open", "/tmp/outside/link");
+  EXPECT_EQ(Check("/tmp/outside/link"), FileAnswer::kMay);
+  EXPECT_EQ(resolved_, "/tmp/share/open");
+}
+
+TEST_F(OwnerShareableFile, FolderMayBeALinkItself) {
+  fs::create_directory_symlink("/tmp/share", "/tmp/outside/volume");
+  folders_ = {"/tmp/outside/volume"};
+  EXPECT_EQ(Check("/tmp/outside/volume/open"), FileAnswer::kMay);
+  EXPECT_EQ(resolved_, "/tmp/share/open");
+}
+
+TEST_F(OwnerShareableFile, WhatIsNoRegularFileMayNot) {
+  ASSERT_EQ(mkfifo("/tmp/share/pipe", 0644), 0);
+  EXPECT_EQ(Check("/tmp/share/pipe"), FileAnswer::kNotReadable);
+  EXPECT_EQ(Check("/tmp/share/sub"), FileAnswer::kNotReadable);
+  EXPECT_EQ(Check("/tmp/share"), FileAnswer::kNotReadable);
+  folders_ = {"/dev"};
+  EXPECT_EQ(Check("/dev/null"), FileAnswer::kNotReadable);
+}
+
+TEST_F(OwnerShareableFile, WhatIsNotThereMayNot) {
+  EXPECT_EQ(Check("/tmp/share/missing"), FileAnswer::kNotReadable);
+  fs::create_symlink("missing", "/tmp/share/dangling");
+  EXPECT_EQ(Check("/tmp/share/dangling"), FileAnswer::kNotReadable);
+}
+
+TEST_F(OwnerShareableFile, FileInAFolderClosedToTheOwnerMayNot) {
+  ASSERT_EQ(chmod("/tmp/share/sub", 0700), 0);
+  EXPECT_EQ(Check("/tmp/share/sub/friends"), FileAnswer::kNotReadable);
+}
+
+TEST_F(OwnerShareableFile, PathsThatAreNotAbsoluteMayNot) {
+  ASSERT_EQ(chdir("/tmp/share"), 0);
+  EXPECT_EQ(Check("open"), FileAnswer::kNotReadable);
+  EXPECT_EQ(Check(""), FileAnswer::kNotReadable);
+  EXPECT_EQ(Check(std::string("/tmp/share/open\0x", 17)), FileAnswer::kNotReadable);
+  ASSERT_EQ(chdir("/"), 0);
+}
+
+TEST_F(OwnerShareableFile, WithoutFoldersNothingMay) {
+  folders_.clear();
+  EXPECT_EQ(Check("/tmp/share/open"), FileAnswer::kOutside);
+  folders_ = {"/tmp/nosuchfolder"};
+  EXPECT_EQ(Check("/tmp/share/open"), FileAnswer::kOutside);
+}
+
+TEST_F(OwnerShareableFile, NameMayHoldLineFeedsAndQuotes) {
+  Make("/tmp/share/a\n'b\"", 2001, 0600);
+  EXPECT_EQ(Check("/tmp/share/a\n'b\""), FileAnswer::kMay);
+  EXPECT_EQ(resolved_, "/tmp/share/a\n'b\"");
+}
+
+TEST_F(OwnerShareableFile, SetUserIdRootCanLook) {
+  EXPECT_EQ(tuvo_test::RunInChildAs(
+                {33, 33, 0, 33, 33, 33},
+                [this] {
+                  return Check("/tmp/share/alices") == FileAnswer::kMay && geteuid() == 33 ? 0 : 1;
+                }),
+            0);
+}
+
+TEST_F(OwnerShareableFile, WhoCannotBecomeTheOwnerCannotTell) {
+  tuvo_test::SyslogListener log;
+  EXPECT_EQ(tuvo_test::RunInChildAs(
+                tuvo_test::kSystem,
+                [this] { return Check("/tmp/share/open") == FileAnswer::kCannotTell ? 0 : 1; }),
+            0);
+}
+
+TEST_F(OwnerShareableFile, UnknownAccountCannotBeAskedAndIsLogged) {
+  tuvo_test::SyslogListener log;
+  errno = 0;
+  EXPECT_EQ(Check("/tmp/share/open", Account{4711, "mallory", false}), FileAnswer::kCannotTell);
+  const std::vector<std::string> lines = log.TakeTexts();
+  ASSERT_EQ(lines.size(), 1U);
+  EXPECT_EQ(lines[0].rfind("shareable_file:", 0), 0U);
+}
+
+TEST_F(OwnerShareableFile, LeavesNoChildAndNoDescriptor) {
+  const auto descriptors = [] {
+    return std::distance(fs::directory_iterator("/proc/self/fd"), fs::directory_iterator());
+  };
+  const auto before = descriptors();
+  for (int i = 0; i < 20; ++i) {
+    Check("/tmp/share/open");
+  }
+  EXPECT_EQ(descriptors(), before);
+  EXPECT_EQ(waitpid(-1, nullptr, WNOHANG), -1);
+}
+
+}  // namespace
+}  // namespace owner

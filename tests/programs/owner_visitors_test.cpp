@@ -1,0 +1,119 @@
+#include "owner/visitors.h"
+
+#include <gtest/gtest.h>
+#include <tuvosharing/entry_db.h>
+#include <tuvosharing/session_db.h>
+#include <tuvosharing/sharing_db.h>
+#include <tuvosharing/token_db.h>
+
+namespace owner {
+namespace {
+
+using TUVO::sharing::db::EntryDB;
+using TUVO::sharing::db::SessionDB;
+using TUVO::sharing::db::SharingDB;
+using TUVO::sharing::db::TokenDB;
+using TUVO::sharing::record::Entry;
+using TUVO::sharing::record::Session;
+using TUVO::sharing::record::Token;
+
+constexpr unsigned int kNobody = 4294967295U;
+
+class OwnerVisitors : public testing::Test {
+ protected:
+  void SetUp() override { link_ = MakeLink(); }
+  void TearDown() override {
+    db_.Execute("DELETE FROM entry");
+    db_.Execute("DELETE FROM session");
+  }
+
+  Entry MakeLink() {
+    Entry link;
+    link.set_project_name("album").set_owner_uid(2001).set_app(Json::objectValue);
+    EXPECT_TRUE(EntryDB(db_).CreateWithHash(link));
+    return link;
+  }
+
+  void Admit(const Entry& link, const std::string& ip, unsigned int uid, long seconds) {
+    Session session;
+    session.set_ip(ip).set_uid(uid);
+    session.set_timeout(static_cast<long>(now_) + 100000);
+    ASSERT_TRUE(SessionDB(db_).CreateWithSessionId(session));
+    Token token;
+    token.set_entry_id(link.get_id());
+    token.set_session_id(session.get_id());
+    token.set_timeout(static_cast<long>(now_) + 100000);
+    ASSERT_TRUE(TokenDB(db_).Create(token));
+    ASSERT_TRUE(db_.Execute("UPDATE token SET timeout = " + std::to_string(now_ + seconds) +
+                            " WHERE id = " + std::to_string(token.get_id())));
+  }
+
+  std::vector<Visitor> List(int most = 10) {
+    std::vector<Visitor> visitors;
+    EXPECT_EQ(ListVisitors(db_, link_, most, now_, &visitors, &total_), std::nullopt);
+    return visitors;
+  }
+
+  SharingDB& db_ = SharingDB::Instance();
+  std::time_t now_ = std::time(nullptr);
+  Entry link_;
+  int total_ = -1;
+};
+
+TEST_F(OwnerVisitors, LinkThatNobodyOpenedHasNone) {
+  EXPECT_TRUE(List().empty());
+  EXPECT_EQ(total_, 0);
+}
+
+TEST_F(OwnerVisitors, StrangerHasAnAddressAndNoName) {
+  Admit(link_, "192.0.2.7", kNobody, 500);
+  const std::vector<Visitor> visitors = List();
+  ASSERT_EQ(visitors.size(), 1U);
+  EXPECT_EQ(visitors[0].ip, "192.0.2.7");
+  EXPECT_EQ(visitors[0].user, "");
+  EXPECT_EQ(visitors[0].expires_at, now_ + 500);
+}
+
+TEST_F(OwnerVisitors, AccountIsNamed) {
+  Admit(link_, "192.0.2.7", 2002, 500);
+  EXPECT_EQ(List().at(0).user, "bob");
+}
+
+TEST_F(OwnerVisitors, AccountThatIsGoneHasNoName) {
+  Admit(link_, "192.0.2.7", 4711, 500);
+  EXPECT_EQ(List().at(0).user, "");
+}
+
+TEST_F(OwnerVisitors, ThoseOfOtherLinksAreLeftOut) {
+  Admit(MakeLink(), "192.0.2.7", kNobody, 500);
+  EXPECT_TRUE(List().empty());
+  EXPECT_EQ(total_, 0);
+}
+
+TEST_F(OwnerVisitors, ExpiredOnesAreLeftOut) {
+  Admit(link_, "192.0.2.7", kNobody, -1);
+  EXPECT_TRUE(List().empty());
+  EXPECT_EQ(total_, 0);
+}
+
+TEST_F(OwnerVisitors, ThoseThatEndLastComeFirst) {
+  Admit(link_, "192.0.2.1", kNobody, 100);
+  Admit(link_, "192.0.2.2", kNobody, 300);
+  Admit(link_, "192.0.2.3", kNobody, 200);
+  const std::vector<Visitor> visitors = List();
+  ASSERT_EQ(visitors.size(), 3U);
+  EXPECT_EQ(visitors[0].ip, "192.0.2.2");
+  EXPECT_EQ(visitors[1].ip, "192.0.2.3");
+  EXPECT_EQ(visitors[2].ip, "192.0.2.1");
+}
+
+TEST_F(OwnerVisitors, ListIsBoundedAndTheTotalIsNot) {
+  for (int i = 1; i <= 5; ++i) {
+    Admit(link_, "192.0.2." + std::to_string(i), kNobody, 100 + i);
+  }
+  EXPECT_EQ(List(3).size(), 3U);
+  EXPECT_EQ(total_, 5);
+}
+
+}  // namespace
+}  // namespace owner
