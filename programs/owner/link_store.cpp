@@ -75,7 +75,14 @@ MaybeProblem Purge(BaseDB& db, EntryDB& links, Scope scope, const std::string& p
 
 MaybeProblem CreateLink(BaseDB& db, Entry* link) {
   if (link->get_hash().empty()) {
-    return EntryDB(db).CreateWithHash(*link) ? std::nullopt : InternalFault();
+    // Any failure would count as a hash that is taken; without the lock, each of the attempts would
+    // wait for it.
+    return InTransaction(
+        db,
+        [link](EntryDB& links) {
+          return links.CreateWithHash(*link) ? std::nullopt : InternalFault();
+        },
+        Locking::kFirst);
   }
   return InTransaction(db, [&db, link](EntryDB& links) {
     if (MaybeProblem problem = CheckHashFree(db, link->get_hash(), 0)) {
@@ -125,11 +132,14 @@ MaybeProblem DeleteExpiredLinks(BaseDB& db, Scope scope, const std::string& proj
 // The very deletion, taken back: only that counts exactly what it would delete.
 MaybeProblem CountExpiredLinks(BaseDB& db, Scope scope, const std::string& project, int* count) {
   bool counted = false;
-  const MaybeProblem problem = InTransaction(db, [&](EntryDB& links) {
-    MaybeProblem fault = Purge(db, links, scope, project, count);
-    counted = !fault;
-    return fault ? fault : Fault(Error::kConflict, "only counted");
-  });
+  const MaybeProblem problem = InTransaction(
+      db,
+      [&](EntryDB& links) {
+        MaybeProblem fault = Purge(db, links, scope, project, count);
+        counted = !fault;
+        return fault ? fault : Fault(Error::kConflict, "only counted");
+      },
+      Locking::kFirst);
   return counted ? std::nullopt : problem;
 }
 

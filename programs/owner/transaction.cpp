@@ -1,11 +1,6 @@
 #include "owner/transaction.h"
 
-#include <tuvoplatform/random.h>
-
-#include <algorithm>
-#include <chrono>
 #include <string>
-#include <thread>
 
 namespace owner {
 
@@ -15,22 +10,10 @@ using TUVO::sharing::db::BaseDB;
 using TUVO::sharing::db::EntryDB;
 using Work = std::function<MaybeProblem(EntryDB&)>;
 
-constexpr int kShortestPause = 5;    // milliseconds
-constexpr int kLongestPause = 1000;  // milliseconds
-
 // What SQLite says of a file that another connection writes to, and of a transaction whose reads
 // another connection's write has made stale.
-bool MetAnotherWriter(const BaseDB& db) {
+bool IsLocked(const BaseDB& db) {
   return db.GetLastError().find("locked") != std::string::npos;
-}
-
-// Two that have met are not to meet again at once. The pauses grow, to about ten seconds in all: as
-// long as a single statement waits for a locked file.
-void Pause(int attempt) {
-  TUVO::RANDOM::TUVORandom random;
-  constexpr int kDoublings = 8;
-  const int longest = std::min(kShortestPause << std::min(attempt, kDoublings), kLongestPause);
-  std::this_thread::sleep_for(std::chrono::milliseconds(random.random(kShortestPause, longest)));
 }
 
 // Takes back what was not committed.
@@ -57,33 +40,39 @@ class OpenTransaction {
   bool open_;
 };
 
-enum class Outcome { kDone, kProblem, kAgain };
+// A write that changes nothing takes the lock, and waits for it as every first statement does; one
+// that comes after a read is refused at once.
+bool TakeLock(BaseDB& db) {
+  return db.Execute("DELETE FROM entry WHERE 0");
+}
 
-Outcome Attempt(BaseDB& db, EntryDB& links, const Work& work, MaybeProblem* problem) {
+MaybeProblem Attempt(BaseDB& db, EntryDB& links, const Work& work, Locking locking) {
   OpenTransaction transaction(db);
-  *problem = transaction.IsOpen() ? work(links) : InternalFault();
-  if (!*problem && !transaction.Commit()) {
-    *problem = InternalFault();
+  if (!transaction.IsOpen() || (locking == Locking::kFirst && !TakeLock(db))) {
+    return InternalFault();
   }
-  if (!*problem) {
-    return Outcome::kDone;
+  MaybeProblem problem = work(links);
+  if (!problem && !transaction.Commit()) {
+    problem = InternalFault();
   }
-  const bool failed = (*problem)->error == Error::kInternal;
-  return failed && MetAnotherWriter(db) ? Outcome::kAgain : Outcome::kProblem;
+  return problem;
+}
+
+bool MetAnotherWriter(const BaseDB& db, const MaybeProblem& problem) {
+  return problem && problem->error == Error::kInternal && IsLocked(db);
 }
 
 }  // namespace
 
-MaybeProblem InTransaction(BaseDB& db, const Work& work) {
+MaybeProblem InTransaction(BaseDB& db, const Work& work, Locking locking) {
   EntryDB links(db);  // ends, and checkpoints, behind the last transaction
-  for (int attempt = 0; attempt < kMostAttempts; ++attempt) {
-    MaybeProblem problem;
-    if (Attempt(db, links, work, &problem) != Outcome::kAgain) {
-      return problem;
-    }
-    Pause(attempt);
+  MaybeProblem problem = Attempt(db, links, work, locking);
+  if (locking != Locking::kFirst && MetAnotherWriter(db, problem)) {
+    problem = Attempt(db, links, work, Locking::kFirst);
   }
-  return Fault(Error::kBusy, "other programs keep writing; try again");
+  return MetAnotherWriter(db, problem)
+             ? Fault(Error::kBusy, "other programs keep the links locked; try again")
+             : problem;
 }
 
 }  // namespace owner

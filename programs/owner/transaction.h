@@ -11,16 +11,23 @@
 
 namespace owner {
 
+// When a transaction is to have the file for itself.
+enum class Locking {
+  kWhenWriting,  // with its first write: short, and mostly nobody else is there
+  kFirst,        // before anything else, for what begins with a write that must not be tried again
+};
+
 // Runs `work` between Begin and Commit. What it reads is of one moment; when another program has
-// written since, or keeps the file locked, the transaction is taken back and `work` runs again from
-// the beginning, after a pause, up to kMostAttempts times: it must do nothing that cannot be
-// repeated, and return InternalFault() when a statement failed. A problem that it returns takes
-// everything back and is returned; Error::kBusy says that every attempt met another program.
+// written since, or is writing, the transaction is taken back and `work` runs once more from the
+// beginning, this time with the file locked before, for which it waits up to 10 seconds: `work`
+// must do nothing that cannot be repeated, and return InternalFault() when a statement failed. With
+// Locking::kFirst it runs so at once, and never again. A problem that it returns takes everything
+// back and is returned; Error::kBusy says that the file could not be had.
 // `work` must not make stores of its own: the end of a store checkpoints, which a transaction
 // forbids. May throw std::bad_alloc; everything is then taken back.
-constexpr int kMostAttempts = 25;
 MaybeProblem InTransaction(TUVO::sharing::db::BaseDB& db,
-                           const std::function<MaybeProblem(TUVO::sharing::db::EntryDB&)>& work);
+                           const std::function<MaybeProblem(TUVO::sharing::db::EntryDB&)>& work,
+                           Locking locking = Locking::kWhenWriting);
 
 }  // namespace owner
 
