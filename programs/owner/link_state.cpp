@@ -86,4 +86,8 @@ std::string StateClause(LinkState state, std::time_t now) {
          ")";
 }
 
+std::string EndedClause(std::time_t now) {
+  return "(" + Past(std::to_string(now)) + " OR " + kUsedUpClause + ")";
+}
+
 }  // namespace owner

@@ -23,6 +23,11 @@ std::optional<LinkState> StateOfText(std::string_view text);
 // The condition, in parentheses, that exactly the rows of that state meet.
 std::string StateClause(LinkState state, std::time_t now);
 
+// The condition, in parentheses, that rows past their end or used up meet, whatever else they are:
+// what is removed as ended. Unlike the library's own purges it takes a negative end or limit for
+// none, as everything does that shows links and lets visitors in.
+std::string EndedClause(std::time_t now);
+
 }  // namespace owner
 
 #endif  // PROGRAMS_OWNER_LINK_STATE_H_

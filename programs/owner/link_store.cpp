@@ -1,9 +1,14 @@
 #include "owner/link_store.h"
 
+#include <tuvosharing/condition.h>
 #include <tuvosharing/entry_db.h>
+#include <tuvosharing/keys.h>
 #include <tuvosharing/result.h>
 #include <tuvosharing/row.h>
 
+#include <ctime>
+
+#include "owner/link_state.h"
 #include "owner/transaction.h"
 
 namespace owner {
@@ -11,12 +16,11 @@ namespace owner {
 namespace {
 
 using TUVO::sharing::db::BaseDB;
+using TUVO::sharing::db::Condition;
 using TUVO::sharing::db::EntryDB;
 using TUVO::sharing::db::Result;
 using TUVO::sharing::db::Row;
 using TUVO::sharing::record::Entry;
-
-constexpr unsigned int kAnyOwner = 4294967295U;
 
 MaybeProblem NoSuchLink() {
   return Fault(Error::kNoSuchLink, "there is no such link");
@@ -59,11 +63,18 @@ MaybeProblem CheckHashFree(BaseDB& db, const std::string& hash, int id) {
                              : std::nullopt;
 }
 
-MaybeProblem Purge(BaseDB& db, EntryDB& links, Scope scope, const std::string& project,
-                   int* deleted) {
+MaybeProblem Purge(BaseDB& db, Scope scope, const std::string& project, int* deleted) {
+  Condition ended(db);
+  ended.Where(EndedClause(std::time(nullptr)));
+  if (scope) {
+    ended.Where(TUVO::sharing::SZK_OWNER_UID, std::to_string(*scope));
+  }
+  if (!project.empty()) {
+    ended.Where(TUVO::sharing::SZK_PROJECT_NAME, project);
+  }
   Result result;
   Row row;
-  if (!links.PurgeExpiredByOwnerProject(scope.value_or(kAnyOwner), project) ||
+  if (!db.Execute("DELETE FROM entry" + ended.GetSQL()) ||
       !db.Execute("SELECT changes() AS c", result) || !result.NextRow(row)) {
     return InternalFault();
   }
@@ -125,8 +136,7 @@ MaybeProblem DeleteLink(BaseDB& db, const LinkName& name, Scope scope, Entry* li
 }
 
 MaybeProblem DeleteExpiredLinks(BaseDB& db, Scope scope, const std::string& project, int* deleted) {
-  return InTransaction(db,
-                       [&](EntryDB& links) { return Purge(db, links, scope, project, deleted); });
+  return InTransaction(db, [&](EntryDB& /*links*/) { return Purge(db, scope, project, deleted); });
 }
 
 // The very deletion, taken back: only that counts exactly what it would delete.
@@ -134,8 +144,8 @@ MaybeProblem CountExpiredLinks(BaseDB& db, Scope scope, const std::string& proje
   bool counted = false;
   const MaybeProblem problem = InTransaction(
       db,
-      [&](EntryDB& links) {
-        MaybeProblem fault = Purge(db, links, scope, project, count);
+      [&](EntryDB& /*links*/) {
+        MaybeProblem fault = Purge(db, scope, project, count);
         counted = !fault;
         return fault ? fault : Fault(Error::kConflict, "only counted");
       },

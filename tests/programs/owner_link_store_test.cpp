@@ -227,6 +227,14 @@ TEST_F(OwnerLinkStore, ExpiredLinksAreDeletedAndCounted) {
   EXPECT_FALSE(IsThere(used));
 }
 
+TEST_F(OwnerLinkStore, NegativeEndsAndLimitsAreNone) {
+  const Entry link = Stored(Link().set_expire_times(-1).set_expire_at(-5).set_use_count(3));
+  int deleted = -1;
+  EXPECT_EQ(DeleteExpiredLinks(*db_, std::nullopt, "", &deleted), std::nullopt);
+  EXPECT_EQ(deleted, 0);
+  EXPECT_TRUE(IsThere(link));
+}
+
 TEST_F(OwnerLinkStore, ExpiredLinksOfOthersStay) {
   const Entry mine = Stored(Link().set_expire_at(1));
   const Entry others = Stored(Link().set_expire_at(1).set_owner_uid(2002));
