@@ -5,6 +5,8 @@
 #include <tuvosharing/keys.h>
 #include <unistd.h>
 
+#include <algorithm>
+#include <cstdint>
 #include <cstdlib>
 #include <memory>
 
@@ -76,19 +78,31 @@ void CopyDatabase(const std::string& from, const std::string& to) {
 void HandOver(const std::string& copy, int to) {
   const common::UniqueFd from(open(copy.c_str(), O_RDONLY | O_CLOEXEC | O_NOFOLLOW));
   struct stat st {};
-  if (from.get() < 0 || fstat(from.get(), &st) != 0 ||
-      !common::CopyAll(from.get(), 0, st.st_size, to)) {
+  if (from.get() < 0 || fstat(from.get(), &st) != 0) {
     throw SystemFailure("the copy cannot be written");
+  }
+  constexpr std::int64_t kPiece = 1 << 20;
+  Progress progress("bytes written", st.st_size);
+  for (std::int64_t done = 0; done < st.st_size; done += kPiece) {
+    StopIfInterrupted();
+    progress.Show(done);
+    if (!common::CopyAll(from.get(), done, std::min(kPiece, st.st_size - done), to)) {
+      throw SystemFailure("the copy cannot be written");
+    }
   }
 }
 
 }  // namespace
 
 ExitStatus Backup(const BackupOptions& options) {
+  if (options.file == "-") {
+    throw Failure(ExitStatus::kUsage, "backup: a database needs a file; ./- would be one");
+  }
   NewFile file(options.file, options.force);
   const CopyPlace place(TUVO::sharing::SZF_SHARING_DB_PATH);
   CopyDatabase(TUVO::sharing::SZF_SHARING_DB_PATH, place.Path());
   HandOver(place.Path(), file.fd());
+  StopIfInterrupted();
   file.Keep();
   return ExitStatus::kDone;
 }

@@ -10,7 +10,9 @@
 
 #include "cli/as_caller.h"
 #include "cli/failure.h"
+#include "cli/interrupt.h"
 #include "cli/line_reader.h"
+#include "cli/live_database.h"
 
 namespace cli {
 
@@ -22,6 +24,9 @@ Failure TakenFailure(const std::string& path) {
 
 // Where `path` leads now must be empty, or a file that may go.
 void CheckPlace(const std::string& path, bool replace) {
+  if (BelongsToDatabase(path)) {
+    throw Failure(ExitStatus::kUsage, path + ": is a place of the database in use");
+  }
   struct stat st {};
   if (lstat(path.c_str(), &st) != 0) {
     if (errno == ENOENT) {
@@ -51,6 +56,17 @@ bool NameAnew(const std::string& from, const std::string& to) {
          unlink(from.c_str()) == 0;
 }
 
+// A named pipe makes its opener wait for the other end.
+int OpenForReading(const std::string& path) {
+  for (;;) {
+    StopIfInterrupted();
+    const int fd = open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NOCTTY);
+    if (fd >= 0 || errno != EINTR) {
+      return fd;
+    }
+  }
+}
+
 // The name of the new file is to outlive a crash as well.
 void SyncFolder(const std::string& path) {
   const common::UniqueFd folder(open(FolderOf(path).c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
@@ -63,7 +79,7 @@ void SyncFolder(const std::string& path) {
 
 common::UniqueFd OpenCallersFile(const std::string& path) {
   const AsCaller as_caller;
-  common::UniqueFd fd(open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NOCTTY));
+  common::UniqueFd fd(OpenForReading(path));
   if (fd.get() < 0) {
     throw SystemFailure(path);
   }

@@ -9,7 +9,7 @@
 
 namespace cli {
 
-// Opens the file for reading; throws Failure.
+// Opens the file for reading; throws Failure, and Interruption when a signal came meanwhile.
 common::UniqueFd OpenCallersFile(const std::string& path);
 
 // The file's content; throws Failure when there is more than `most` bytes of it.
@@ -18,7 +18,8 @@ std::string ReadCallersFile(const std::string& path, std::size_t most);
 // A new file, mode 0600, that appears under its name when it is whole.
 class NewFile {
  public:
-  // A file that is at `path` already is a Failure, unless `replace` and it is a regular file.
+  // A file that is at `path` already is a Failure, unless `replace` and it is a regular file; a
+  // place of the database in use (live_database.h) always is.
   NewFile(const std::string& path, bool replace);
   // Removes what was not kept.
   ~NewFile();

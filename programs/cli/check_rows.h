@@ -14,7 +14,8 @@ namespace cli {
 // Runs a statement; throws when it fails.
 using RunQuery = std::function<TUVO::sharing::db::Result(const std::string& sql)>;
 
-// Links that do not load as legal, and sessions and tokens that could not be anybody's. That these
+// Links that do not load as legal, sessions and tokens that could not be anybody's, and rows whose
+// numbers no program can name. That these
 // have expired is no damage.
 void CheckRows(const RunQuery& query, Findings* findings);
 

@@ -3,11 +3,13 @@
 #include <CLI/App.hpp>
 #include <CLI/Config.hpp>
 #include <CLI/Formatter.hpp>
+#include <algorithm>
 #include <iostream>
 #include <memory>
 
 #include "cli/commands.h"
 #include "cli/failure.h"
+#include "cli/separate_words.h"
 #include "cli/setting_options.h"
 
 namespace cli {
@@ -286,7 +288,9 @@ std::function<ExitStatus()> ReadCommandLine(int argc, const char* const* argv) {
   app.require_subcommand(0, 1);
   AddCommands(&app, &action);
   try {
-    app.parse(argc, argv);
+    std::vector<std::string> words = SeparateWords(app, {argv + 1, argv + argc});
+    std::reverse(words.begin(), words.end());  // as the reading wants them
+    app.parse(words);
   } catch (const CLI::Success& asked) {
     app.exit(asked, std::cout, std::cerr);
     return {};

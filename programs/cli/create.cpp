@@ -10,6 +10,7 @@
 #include "cli/database.h"
 #include "cli/display.h"
 #include "cli/failure.h"
+#include "cli/interrupt.h"
 #include "cli/output.h"
 #include "common/config.h"
 #include "owner/link_store.h"
@@ -61,6 +62,9 @@ ExitStatus Create(const CreateOptions& options) {
   Entry link;
   const owner::MaybeProblem problem = MakeLink(given, now, &link);
   LogChange("create", problem ? 0 : link.get_id(), problem);
+  if (problem) {
+    StopIfInterrupted();  // which the waiting for a lock may have outlived
+  }
   Require(problem);
   Print(link, options, now);
   return ExitStatus::kDone;

@@ -4,15 +4,19 @@
 #include <tuvosharing/row.h>
 
 #include <functional>
+#include <set>
 
 #include "cli/change_log.h"
 #include "cli/commands.h"
+#include "cli/damage.h"
 #include "cli/database.h"
 #include "cli/display.h"
 #include "cli/failure.h"
 #include "cli/interrupt.h"
 #include "cli/link_name.h"
+#include "cli/link_row.h"
 #include "cli/output.h"
+#include "cli/row_id.h"
 #include "cli/terminal.h"
 #include "owner/link_store.h"
 #include "owner/transaction.h"
@@ -29,10 +33,17 @@ using TUVO::sharing::record::Entry;
 // The links as they are now, by their row numbers: a hash may come to be another link's.
 std::vector<Entry> FindAll(const std::vector<owner::LinkName>& names) {
   std::vector<Entry> links;
+  std::set<int> known;  // one may be named by its hash and by its number
   for (const owner::LinkName& name : names) {
     Entry link;
-    Require(owner::FindLink(Database(), name, std::nullopt, &link), TextOf(name));
-    links.push_back(link);
+    const owner::MaybeProblem problem = owner::FindLink(Database(), name, std::nullopt, &link);
+    if (problem) {
+      LogChange("delete", 0, problem);
+      throw FailureOf(*problem, TextOf(name));
+    }
+    if (known.insert(link.get_id()).second) {
+      links.push_back(link);
+    }
   }
   return links;
 }
@@ -58,15 +69,16 @@ void AskFirst(const std::string& question) {
 }
 
 // Calls `remove` for each row number.
-ExitStatus DeleteEach(const std::vector<int>& ids,
-                      const std::function<owner::MaybeProblem(int id)>& remove) {
+ExitStatus DeleteEach(const std::vector<RowId>& ids,
+                      const std::function<owner::MaybeProblem(RowId id)>& remove) {
   ExitStatus status = ExitStatus::kDone;
-  for (const int id : ids) {
+  for (const RowId id : ids) {
     StopIfInterrupted();
     const owner::MaybeProblem problem = remove(id);
-    LogChange("delete", id, problem);
+    LogChange("delete", IsUsualId(id) ? static_cast<int>(id) : 0, problem);
     if (problem) {
-      const Failure failure = FailureOf(*problem, TextOf({id, {}}));
+      StopIfInterrupted();  // which the waiting for a lock may have outlived
+      const Failure failure = FailureOf(*problem, "#" + std::to_string(id));
       Complain(failure.what());
       status = status == ExitStatus::kDone ? failure.status() : status;
     }
@@ -74,9 +86,9 @@ ExitStatus DeleteEach(const std::vector<int>& ids,
   return status;
 }
 
-owner::MaybeProblem DeleteLinkById(int id) {
+owner::MaybeProblem DeleteLinkById(RowId id) {
   Entry link;
-  return owner::DeleteLink(Database(), {id, {}}, std::nullopt, &link);
+  return owner::DeleteLink(Database(), {static_cast<int>(id), {}}, std::nullopt, &link);
 }
 
 ExitStatus DeleteLinks(const DeleteOptions& options) {
@@ -84,7 +96,8 @@ ExitStatus DeleteLinks(const DeleteOptions& options) {
   if (!options.yes) {
     AskFirst(QuestionAbout(links));
   }
-  std::vector<int> ids;
+  std::vector<RowId> ids;
+  ids.reserve(links.size());
   for (const Entry& link : links) {
     ids.push_back(link.get_id());
   }
@@ -92,31 +105,27 @@ ExitStatus DeleteLinks(const DeleteOptions& options) {
 }
 
 // A row that loads as a link is none of these, whatever number was typed.
-owner::MaybeProblem DeleteDamagedRow(int id) {
-  return owner::InTransaction(Database(), [id](EntryDB& links) -> owner::MaybeProblem {
+owner::MaybeProblem DeleteDamagedRow(RowId id) {
+  const std::string from_row = " FROM entry WHERE id = " + std::to_string(id);
+  return owner::InTransaction(Database(), [&](EntryDB& /*links*/) -> owner::MaybeProblem {
+    StopIfInterrupted();
     Result result;
     Row row;
-    if (!Database().Execute("SELECT * FROM entry WHERE id = " + std::to_string(id), result)) {
+    if (!Database().Execute("SELECT " + LinkRowSelection() + from_row, result)) {
       return owner::InternalFault();
     }
     if (!result.NextRow(row)) {
       return owner::Fault(owner::Error::kNoSuchLink, "there is no such row");
     }
-    if (Entry().FromRow(row)) {
+    if (IsUsualId(id) && !DamageOf(row)) {
       return owner::Fault(owner::Error::kConflict, "is not damaged");
     }
-    return links.Delete(id) ? std::nullopt : owner::InternalFault();
+    return Database().Execute("DELETE" + from_row) ? std::nullopt : owner::InternalFault();
   });
 }
 
 ExitStatus DeleteDamaged(const DeleteOptions& options) {
-  std::vector<int> ids;
-  for (const owner::LinkName& name : LinkNamesOf(options.links.texts, options.links.ids)) {
-    if (name.id == 0) {
-      throw Failure(ExitStatus::kUsage, "--damaged: rows are named by their numbers, as #ID");
-    }
-    ids.push_back(name.id);
-  }
+  const std::vector<RowId> ids = RowIdsOf(options.links.texts, options.links.ids);
   if (!options.yes) {
     AskFirst("Delete " + std::to_string(ids.size()) + " damaged rows?");
   }

@@ -17,18 +17,15 @@ struct Range {
   std::uint32_t first;
   std::uint32_t last;
 };
-// Controls, and characters that are there to steer how others are shown.
-constexpr std::array<Range, 11> kUnshown = {{{0x00, 0x1F},
-                                             {0x7F, 0x9F},
-                                             {0xAD, 0xAD},
-                                             {0x61C, 0x61C},
-                                             {0x180E, 0x180E},
-                                             {0x200B, 0x200F},
-                                             {0x2028, 0x202E},
-                                             {0x2060, 0x206F},
-                                             {0xFEFF, 0xFEFF},
-                                             {0xFFF9, 0xFFFB},
-                                             {0xE0000, 0xE0FFF}}};
+// Controls, separators of lines and paragraphs, and all format characters (Cf) of Unicode 15, which
+// are there to steer how others are shown; with the places kept for more of them.
+constexpr std::array<Range, 21> kUnshown = {
+    {{0x00, 0x1F},       {0x7F, 0x9F},       {0xAD, 0xAD},       {0x600, 0x605},
+     {0x61C, 0x61C},     {0x6DD, 0x6DD},     {0x70F, 0x70F},     {0x890, 0x891},
+     {0x8E2, 0x8E2},     {0x180E, 0x180E},   {0x200B, 0x200F},   {0x2028, 0x202E},
+     {0x2060, 0x206F},   {0xFEFF, 0xFEFF},   {0xFFF9, 0xFFFB},   {0x110BD, 0x110BD},
+     {0x110CD, 0x110CD}, {0x13430, 0x1343F}, {0x1BCA0, 0x1BCA3}, {0x1D173, 0x1D17A},
+     {0xE0000, 0xE0FFF}}};
 
 bool IsUnshown(std::uint32_t character) {
   for (const Range& range : kUnshown) {

@@ -31,9 +31,14 @@ ExitStatus ChangeLinks(const std::vector<owner::LinkName>& names, const GivenSet
     Entry link;
     const owner::MaybeProblem problem = owner::ChangeLink(
         Database(), name, std::nullopt,
-        [&](Entry* changed) { return ApplyGivenSettings(given, folders, changed); }, &link);
+        [&](Entry* changed) {
+          StopIfInterrupted();
+          return ApplyGivenSettings(given, folders, changed);
+        },
+        &link);
     LogChange("set", link.get_id(), problem);
     if (problem) {
+      StopIfInterrupted();  // which the waiting for a lock may have outlived
       const Failure failure = FailureOf(*problem, TextOf(name));
       Complain(failure.what());
       status = status == ExitStatus::kDone ? failure.status() : status;

@@ -1,6 +1,5 @@
 // tuvosharing export
 #include <tuvosharing/condition.h>
-#include <tuvosharing/entry.h>
 #include <tuvosharing/row.h>
 #include <unistd.h>
 
@@ -9,12 +8,14 @@
 
 #include "cli/caller_file.h"
 #include "cli/commands.h"
+#include "cli/damage.h"
 #include "cli/database.h"
 #include "cli/failure.h"
 #include "cli/interrupt.h"
 #include "cli/link_file.h"
 #include "cli/output.h"
 #include "cli/progress.h"
+#include "cli/row_id.h"
 #include "common/stream.h"
 #include "owner/link_list.h"
 
@@ -26,7 +27,6 @@ using TUVO::sharing::db::BaseDB;
 using TUVO::sharing::db::Condition;
 using TUVO::sharing::db::Result;
 using TUVO::sharing::db::Row;
-using TUVO::sharing::record::Entry;
 
 constexpr int kPiece = 500;
 
@@ -53,20 +53,21 @@ struct Counts {
   long long damaged = 0;
 };
 
-// The rows behind the id `last` as lines; `*last` is then the last row's. False behind the end.
-bool NextLines(BaseDB& db, const owner::ListRequest& request, std::time_t now, int* last,
-               std::string* lines, Counts* counts) {
+// The rows behind `last` as lines, whatever their numbers, which the file does not hold; `*last` is
+// then the last row's. False behind the end.
+bool NextLines(BaseDB& db, const owner::ListRequest& request, std::time_t now,
+               std::optional<RowId>* last, std::string* lines, Counts* counts) {
   Condition condition(db);
   owner::AddFilters(db, request, now, &condition);
-  condition.Where("id > " + std::to_string(*last));
+  condition.Where(BehindRow("id", *last));
   condition.OrderBy("id", true);
   condition.Limit(0, kPiece);
   Result result = Query(db, "SELECT " + LinkRowSelection() + " FROM entry" + condition.GetSQL());
   bool any = false;
   for (Row row; result.NextRow(row); any = true) {
-    *last = row.GetField("id").AsInt(0);
+    *last = RowIdOf(row);
     const std::optional<LinkRow> link = LinkRowOf(row);
-    if (link && Entry().FromRow(row)) {
+    if (link && !DamageOf(row)) {
       *lines += LineOf(*link);
       ++counts->links;
     } else {
@@ -86,7 +87,7 @@ Counts WriteLinks(int fd, const owner::ListRequest& request) {
                     Number(db, "SELECT count(*) AS value FROM entry" + condition.GetSQL()));
   Write(fd, FirstLine());
   Counts counts;
-  int last = 0;
+  std::optional<RowId> last;
   for (bool more = true; more;) {
     StopIfInterrupted();
     std::string lines;

@@ -127,11 +127,7 @@ void CheckUnique(const std::vector<LinkRow>& rows) {
   }
 }
 
-// The write lock first: nobody changes what the conflicts are decided by.
-owner::MaybeProblem TakeAll(BaseDB& db, const std::vector<LinkRow>& rows, Importer* importer) {
-  if (!db.Execute("DELETE FROM entry WHERE 0")) {
-    return owner::InternalFault();
-  }
+owner::MaybeProblem TakeAll(const std::vector<LinkRow>& rows, Importer* importer) {
   Progress progress("imported", static_cast<long long>(rows.size()));
   for (std::size_t i = 0; i < rows.size(); ++i) {
     StopIfInterrupted();
@@ -148,14 +144,18 @@ owner::MaybeProblem ImportAll(const std::vector<LinkRow>& rows, OnConflict on_co
                               bool dry_run, Counts* counts) {
   BaseDB& db = Database();
   bool rehearsed = false;
-  const owner::MaybeProblem problem =
-      owner::InTransaction(db, [&](EntryDB& /*links*/) -> owner::MaybeProblem {
-        Importer importer(db, on_conflict);
-        owner::MaybeProblem fault = TakeAll(db, rows, &importer);
-        *counts = importer.Done();
-        rehearsed = dry_run && !fault;
-        return rehearsed ? owner::Fault(owner::Error::kConflict, "a rehearsal") : fault;
-      });
+  const auto work = [&](EntryDB& /*links*/) -> owner::MaybeProblem {
+    Importer importer(db, on_conflict);
+    owner::MaybeProblem fault = TakeAll(rows, &importer);
+    *counts = importer.Done();
+    rehearsed = dry_run && !fault;
+    return rehearsed ? owner::Fault(owner::Error::kConflict, "a rehearsal") : fault;
+  };
+  // The write lock first: nobody changes what the conflicts are decided by.
+  const owner::MaybeProblem problem = owner::InTransaction(db, work, owner::Locking::kFirst);
+  if (problem && !rehearsed) {
+    StopIfInterrupted();  // which the waiting for a lock may have outlived
+  }
   return rehearsed ? std::nullopt : problem;
 }
 

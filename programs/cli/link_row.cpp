@@ -25,6 +25,10 @@ std::string IsNullColumn(const std::string& column) {
   return "null_" + column;
 }
 
+std::string HoldsZeroColumn(const std::string& column) {
+  return "zero_" + column;
+}
+
 // A number whose text is the one that the number has.
 std::optional<std::int64_t> PlainNumber(const std::string& text) {
   std::int64_t number = 0;
@@ -133,17 +137,25 @@ const std::array<const char*, kLinkColumnCount>& LinkColumns() {
 
 std::string LinkRowSelection() {
   std::string selection = "*";
-  std::string zeros;
   for (const std::string column : LinkColumns()) {
     selection += ", " + column + " IS NULL AS " + IsNullColumn(column);
-    zeros += (zeros.empty() ? "" : " OR ") +
-             ("ifnull(instr(CAST(" + column + " AS BLOB), x'00'), 0) != 0");
+    selection += ", ifnull(instr(CAST(" + column + " AS BLOB), x'00'), 0) != 0 AS " +
+                 HoldsZeroColumn(column);
   }
-  return selection + ", " + zeros + " AS holds_zero";
+  return selection;
+}
+
+std::optional<std::string> ColumnWithZero(const Row& row) {
+  for (const std::string column : LinkColumns()) {
+    if (row.GetField(HoldsZeroColumn(column)).AsBool(true)) {
+      return column;
+    }
+  }
+  return std::nullopt;
 }
 
 std::optional<LinkRow> LinkRowOf(const Row& row) {
-  if (row.GetField("holds_zero").AsBool(true)) {
+  if (ColumnWithZero(row)) {
     return std::nullopt;
   }
   LinkRow link;

@@ -29,6 +29,9 @@ struct LinkRow {
 // What a statement has to select for LinkRowOf, from the table "entry".
 std::string LinkRowSelection();
 
+// The first column that holds a zero byte.
+std::optional<std::string> ColumnWithZero(const TUVO::sharing::db::Row& row);
+
 // Nothing for a row that has a zero byte in a text: the platform reads as far as that.
 std::optional<LinkRow> LinkRowOf(const TUVO::sharing::db::Row& row);
 

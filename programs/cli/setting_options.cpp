@@ -26,6 +26,10 @@ constexpr std::size_t kLargestFile = 1 << 20;
 constexpr std::size_t kLongestPasswordLine = 4096;
 
 std::string PasswordLine() {
+  if (isatty(STDIN_FILENO) != 0) {
+    throw Failure(ExitStatus::kUsage, std::string(kPasswordStdinOption) +
+                                          ": a terminal would show it; there is --password");
+  }
   std::string line;
   if (!LineReader(STDIN_FILENO, kLongestPasswordLine).Next(&line)) {
     throw Failure(ExitStatus::kUsage, std::string(kPasswordStdinOption) + ": there is no line");
@@ -53,6 +57,19 @@ void TakePassword(const SettingOptions& options, Json::Value* arguments) {
   }
 }
 
+// From the current folder; it may have gone.
+std::string AbsolutePath(const std::string& path) {
+  if (path.empty()) {
+    throw Failure(ExitStatus::kUsage, std::string(kPathOption) + ": must not be empty");
+  }
+  std::error_code error;
+  const std::filesystem::path absolute = std::filesystem::absolute(path, error);
+  if (error) {
+    throw Failure(ExitStatus::kFailed, std::string(kPathOption) + ": " + error.message());
+  }
+  return absolute.string();
+}
+
 // The file's checks want a whole path; `app` is what it stands in, given along with it or not.
 void TakePath(const std::string& path, Json::Value* arguments) {
   Json::Value& app = (*arguments)[SZK_APP];
@@ -60,7 +77,7 @@ void TakePath(const std::string& path, Json::Value* arguments) {
     app = Json::Value(Json::objectValue);
   }
   if (app.isObject()) {
-    app[kPathMember] = std::filesystem::absolute(path).string();
+    app[kPathMember] = AbsolutePath(path);
   }
 }
 
@@ -70,6 +87,19 @@ std::vector<owner::Argument> KnownArguments(const std::string& needed) {
     argument.needed = argument.name == needed;
   }
   return known;
+}
+
+// The link's data with another path, by the rules for data that is given as a whole: the two
+// together may be too large.
+owner::MaybeProblem SetPath(const std::string& path, const Entry& link, owner::Settings* settings) {
+  Json::Value arguments(Json::objectValue);
+  Json::Value& app = arguments[SZK_APP];
+  app = link.get_app();
+  if (!app.isObject()) {
+    app = Json::Value(Json::objectValue);
+  }
+  app[kPathMember] = path;
+  return owner::ReadSettings(arguments, std::time(nullptr), settings);
 }
 
 void RemovePassword(Entry* link) {
@@ -177,12 +207,9 @@ owner::MaybeProblem ApplyGivenSettings(const GivenSettings& given,
                                        const std::vector<std::string>& share_folders, Entry* link) {
   owner::Settings settings = given.settings;
   if (given.path) {
-    Json::Value app = link->get_app();
-    if (!app.isObject()) {
-      app = Json::Value(Json::objectValue);
+    if (owner::MaybeProblem problem = SetPath(*given.path, *link, &settings)) {
+      return problem;
     }
-    app[kPathMember] = *given.path;
-    settings.app = app;
   }
   if (given.no_password) {
     RemovePassword(link);

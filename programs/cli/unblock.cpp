@@ -21,6 +21,7 @@ bool IsAddress(const std::string& text) {
 ExitStatus Unblock(const UnblockOptions& options) {
   for (const std::string& address : options.addresses) {
     if (!IsAddress(address)) {
+      LogChange("unblock", 0, owner::Fault(owner::Error::kBadValue, "is no address"));
       throw Failure(ExitStatus::kUsage, address + ": is no address");
     }
   }

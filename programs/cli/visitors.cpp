@@ -3,6 +3,7 @@
 #include <tuvosharing/user_group.h>
 #include <unistd.h>
 
+#include <cstdlib>
 #include <ctime>
 #include <iostream>
 
@@ -12,6 +13,7 @@
 #include "cli/interrupt.h"
 #include "cli/link_name.h"
 #include "cli/output.h"
+#include "cli/row_id.h"
 #include "cli/table.h"
 #include "cli/terminal.h"
 #include "owner/link_store.h"
@@ -50,9 +52,13 @@ std::string UserText(unsigned int uid) {
   return std::to_string(uid);
 }
 
+Json::Int64 NumberOf(const Row& row, const char* column) {
+  return std::strtoll(row.GetField(column).AsString("").c_str(), nullptr, 10);
+}
+
 Json::Value VisitorJson(const Row& row) {
   Json::Value json(Json::objectValue);
-  json["id"] = row.GetField("id").AsInt(0);
+  json["id"] = NumberOf(row, "id");
   json["ip"] = owner::RepairedUtf8(row.GetField("ip").AsString(""));
   json["user"] = UserText(row.GetField("uid").AsUInt(kNobody));
   json["expires_at"] = owner::MomentText(row.GetField("timeout").AsTime(0));
@@ -63,16 +69,17 @@ Json::Value VisitorJson(const Row& row) {
 // `column` is the id's whole name there.
 template <typename Take>
 void ForEachRow(const std::string& sql, const std::string& column, Take take) {
-  int last = 0;
+  std::optional<RowId> last;
   for (bool more = true; more;) {
     StopIfInterrupted();
-    Result result =
-        Query(Database(), sql + " AND " + column + " > " + std::to_string(last) + " ORDER BY " +
-                              column + " LIMIT " + std::to_string(kPiece));
+    std::string piece = sql;
+    piece.append(" AND ").append(BehindRow(column, last));
+    piece.append(" ORDER BY ").append(column).append(" LIMIT ").append(std::to_string(kPiece));
+    Result result = Query(Database(), piece);
     int rows = 0;
     Row row;
     for (; result.NextRow(row); ++rows) {
-      last = row.GetField("id").AsInt(0);
+      last = RowIdOf(row);
       take(row);
     }
     more = rows == kPiece;
@@ -94,7 +101,7 @@ std::string TokensSql(int link, std::time_t now) {
       "SELECT t.id AS id, t.entry_id AS link, t.session_id AS session, t.timeout AS timeout, "
       "e.hash AS hash, s.ip AS ip, s.uid AS uid FROM token AS t JOIN entry AS e ON e.id = "
       "t.entry_id JOIN session AS s ON s.id = t.session_id WHERE t.timeout > " +
-      std::to_string(now);
+      std::to_string(now) + " AND s.timeout > " + std::to_string(now);
   if (link != 0) {
     sql += " AND t.entry_id = " + std::to_string(link);
   }
@@ -112,6 +119,7 @@ void Print(const char* name, const Json::Value& list, Table table,
   }
   for (const Json::Value& item : list) {
     std::vector<std::string> cells;
+    cells.reserve(members.size());
     for (const char* member : members) {
       cells.push_back(item[member].asString());
     }
@@ -141,9 +149,9 @@ ExitStatus Tokens(const VisitorOptions& options) {
   Json::Value list(Json::arrayValue);
   ForEachRow(TokensSql(link, std::time(nullptr)), "t.id", [&list](const Row& row) {
     Json::Value json = VisitorJson(row);
-    json["link"] = row.GetField("link").AsInt(0);
+    json["link"] = NumberOf(row, "link");
     json["hash"] = owner::RepairedUtf8(row.GetField("hash").AsString(""));
-    json["session"] = row.GetField("session").AsInt(0);
+    json["session"] = NumberOf(row, "session");
     list.append(json);
   });
   Print("tokens", list,

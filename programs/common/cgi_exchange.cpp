@@ -5,6 +5,7 @@
 #include <cerrno>
 #include <csignal>
 #include <cstdio>
+#include <utility>
 
 #include "common/stream.h"
 
@@ -28,6 +29,9 @@ bool CgiExchange::WriteFile(int fd, std::int64_t offset, std::int64_t length) {
 }
 
 bool CgiExchange::Finish() {
+  if (std::exchange(finished_, true)) {
+    return true;
+  }
   (void)std::signal(SIGTERM, SIG_IGN);
   return std::fclose(stdout) == 0;
 }

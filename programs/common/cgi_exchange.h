@@ -19,6 +19,9 @@ class CgiExchange final : public Exchange {
   // Web servers take the end of the output for the end of the answer, and end the program then
   // (SIGTERM); from here on the program ignores that, so that what it still does is not cut short.
   bool Finish() override;
+
+ private:
+  bool finished_ = false;
 };
 
 }  // namespace common

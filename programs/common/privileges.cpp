@@ -35,6 +35,15 @@ bool TakeEffectiveIds(uid_t uid, gid_t gid) {
   return true;
 }
 
+bool HasSystemIdsAndSavedRoot() {
+  uid_t real = 0;
+  uid_t effective = 0;
+  uid_t saved = 0;
+  return getresuid(&real, &effective, &saved) == 0 && real == kSystemUid &&
+         effective == kSystemUid && saved == kRootUid && getgid() == kSystemGid &&
+         getegid() == kSystemGid;
+}
+
 }  // namespace
 
 bool DropPrivileges() {
@@ -51,6 +60,25 @@ bool DropPrivileges() {
   }
   return getuid() == kRootUid ? TakeEffectiveIds(kSystemUid, kSystemGid)
                               : TakeEffectiveIds(getuid(), getgid());
+}
+
+bool HideFromCaller() {
+  uid_t real = 0;
+  uid_t effective = 0;
+  uid_t saved = 0;
+  if (getresuid(&real, &effective, &saved) != 0) {
+    return Failed(__LINE__, "getresuid");
+  }
+  if (real == kRootUid || saved != kRootUid) {
+    return true;
+  }
+  // Only root may take the ids of somebody else; the user last, since root is left with it.
+  if (setresuid(kSameUid, kRootUid, kSameUid) != 0 ||
+      setresgid(kSystemGid, kSystemGid, kSameGid) != 0 ||
+      setresuid(kSystemUid, kSystemUid, kSameUid) != 0) {
+    return Failed(__LINE__, "taking the system identity");
+  }
+  return HasSystemIdsAndSavedRoot() || Failed(__LINE__, "the system identity");
 }
 
 }  // namespace common

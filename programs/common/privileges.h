@@ -14,6 +14,14 @@ namespace common {
 // program must then end.
 bool DropPrivileges();
 
+// Leaves the caller of a set-user-id root program, real ids included, for the system identity (uid
+// 1, gid 1), with root kept as the saved id: whoever has the real uid of a process may stop it with
+// a signal, and one that is stopped while it holds the database's lock stops everybody else's
+// programs with it. For after DropPrivileges, and after getuid() has been asked. Nothing is changed
+// without root as the saved id, and for root, whom nothing can be hidden from. False when an id
+// could not be changed (logged): the program must then end.
+bool HideFromCaller();
+
 }  // namespace common
 
 #endif  // PROGRAMS_COMMON_PRIVILEGES_H_

@@ -65,17 +65,22 @@ bool TouchesFile(const Settings& settings) {
   return settings.project_name || settings.owner_uid || settings.app;
 }
 
-MaybeProblem CheckFileLink(const std::vector<std::string>& folders,
-                           TUVO::sharing::record::Entry* link, bool by_administrator) {
-  if (link->get_project_name() != kFileProject) {
+MaybeProblem LookAtFile(const std::vector<std::string>& folders,
+                        const TUVO::sharing::record::Entry& link, bool by_administrator,
+                        FileLook* look) {
+  look->of_file = link.get_project_name() == kFileProject;
+  look->owner_uid = link.get_owner_uid();
+  look->app = link.get_app();
+  look->resolved_app = look->app;
+  if (!look->of_file) {
     return std::nullopt;
   }
-  Json::Value app = link->get_app();
+  Json::Value& app = look->resolved_app;
   if (!app.isObject() || !app[kPath].isString()) {
     return Fault(Error::kConflict, "must name the file, as \"path\"", SZK_APP);
   }
   std::optional<Account> looker;
-  if (MaybeProblem problem = ChooseLooker(link->get_owner_uid(), by_administrator, &looker)) {
+  if (MaybeProblem problem = ChooseLooker(look->owner_uid, by_administrator, &looker)) {
     return problem;
   }
   std::string resolved;
@@ -88,8 +93,27 @@ MaybeProblem CheckFileLink(const std::vector<std::string>& folders,
     return Fault(Error::kFileNotAllowed, "must name a file whose whole path is UTF-8", SZK_APP);
   }
   app[kPath] = resolved;
-  link->set_app(app);
   return std::nullopt;
+}
+
+MaybeProblem UseLook(const FileLook& look, TUVO::sharing::record::Entry* link) {
+  const bool of_file = link->get_project_name() == kFileProject;
+  if (!of_file && !look.of_file) {
+    return std::nullopt;
+  }
+  if (of_file != look.of_file || link->get_owner_uid() != look.owner_uid ||
+      link->get_app() != look.app) {
+    return Fault(Error::kBusy, "the link was changed meanwhile; try again");
+  }
+  link->set_app(look.resolved_app);
+  return std::nullopt;
+}
+
+MaybeProblem CheckFileLink(const std::vector<std::string>& folders,
+                           TUVO::sharing::record::Entry* link, bool by_administrator) {
+  FileLook look;
+  MaybeProblem problem = LookAtFile(folders, *link, by_administrator, &look);
+  return problem ? problem : UseLook(look, link);
 }
 
 }  // namespace owner

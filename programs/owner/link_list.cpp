@@ -3,6 +3,8 @@
 #include <tuvosharing/condition.h>
 #include <tuvosharing/entry_db.h>
 #include <tuvosharing/keys.h>
+#include <tuvosharing/result.h>
+#include <tuvosharing/row.h>
 
 namespace owner {
 
@@ -11,6 +13,9 @@ namespace {
 using TUVO::sharing::db::BaseDB;
 using TUVO::sharing::db::Condition;
 using TUVO::sharing::db::EntryDB;
+using TUVO::sharing::db::Result;
+using TUVO::sharing::db::Row;
+using TUVO::sharing::record::Entry;
 
 // The pattern of LIKE that finds `piece` anywhere, with "\" before what LIKE reads as a wildcard.
 std::string Pattern(const std::string& piece) {
@@ -58,21 +63,37 @@ const std::vector<std::string>& SortColumns() {
   return columns;
 }
 
-MaybeProblem ListLinks(BaseDB& db, const ListRequest& request, std::time_t now,
-                       std::vector<TUVO::sharing::record::Entry>* links, int* total) {
+MaybeProblem ForEachLink(BaseDB& db, const ListRequest& request, std::time_t now,
+                         const std::function<void(const Entry&)>& take, int* total) {
   const EntryDB store(db);
   AddFilters(db, request, now, &store.GetCondition());
   if (!store.Count(*total)) {
     return InternalFault();
   }
-  Condition& condition = store.GetCondition();
+  Condition condition(db);
   AddFilters(db, request, now, &condition);
   condition.OrderBy(request.sort, !request.descending);
   if (request.sort != TUVO::sharing::SZK_ID_) {
     condition.OrderBy(TUVO::sharing::SZK_ID_, !request.descending);
   }
   condition.Limit(request.offset, request.limit);
-  return store.Query(*links) ? std::nullopt : InternalFault();
+  Result rows;
+  if (!db.Execute("SELECT * FROM entry" + condition.GetSQL(), rows)) {
+    return InternalFault();
+  }
+  for (Row row; rows.NextRow(row);) {
+    Entry link;
+    if (link.FromRow(row)) {
+      take(link);
+    }
+  }
+  return std::nullopt;
+}
+
+MaybeProblem ListLinks(BaseDB& db, const ListRequest& request, std::time_t now,
+                       std::vector<Entry>* links, int* total) {
+  return ForEachLink(
+      db, request, now, [links](const Entry& link) { links->push_back(link); }, total);
 }
 
 }  // namespace owner

@@ -7,6 +7,7 @@
 #include <tuvosharing/entry.h>
 
 #include <ctime>
+#include <functional>
 #include <optional>
 #include <string>
 #include <vector>
@@ -38,6 +39,12 @@ void AddFilters(const TUVO::sharing::db::BaseDB& db, const ListRequest& request,
 // a link are counted and left out. Precondition: `sort` is one of SortColumns().
 MaybeProblem ListLinks(TUVO::sharing::db::BaseDB& db, const ListRequest& request, std::time_t now,
                        std::vector<TUVO::sharing::record::Entry>* links, int* total);
+
+// Calls `take` for each link of the page in turn, and keeps none of them: a link with its data may
+// be large, and a page has many.
+MaybeProblem ForEachLink(TUVO::sharing::db::BaseDB& db, const ListRequest& request, std::time_t now,
+                         const std::function<void(const TUVO::sharing::record::Entry&)>& take,
+                         int* total);
 
 }  // namespace owner
 

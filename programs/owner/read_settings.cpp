@@ -24,6 +24,7 @@ constexpr size_t kLongestTitle = 255;
 constexpr size_t kLongestPassword = 128;
 constexpr size_t kLongestUri = 2048;
 constexpr size_t kLargestObject = 65536;
+constexpr size_t kMostValues = 10000;  // in memory the smallest takes fifty times its two bytes
 constexpr Json::ArrayIndex kMostNames = 200;
 
 // One argument being read; the problem names it.
@@ -142,9 +143,21 @@ MaybeProblem ReadUri(const Reading& reading, Settings* settings) {
   return std::nullopt;
 }
 
+// All values within `value`, itself counted.
+size_t CountValues(const Json::Value& value) {
+  size_t count = 1;
+  for (const Json::Value& member : value) {
+    count += CountValues(member);
+  }
+  return count;
+}
+
 MaybeProblem ReadObject(const Reading& reading, std::optional<Json::Value>* setting) {
   if (WriteJson(reading.Value()).size() > kLargestObject) {
     return reading.Bad("must be at most 64 KiB of JSON");
+  }
+  if (CountValues(reading.Value()) > kMostValues) {
+    return reading.Bad("must hold at most " + std::to_string(kMostValues) + " values");
   }
   *setting = reading.Value();
   return std::nullopt;

@@ -1,6 +1,7 @@
 #include "owner/shareable_file.h"
 
 #include <fcntl.h>
+#include <poll.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <syslog.h>
@@ -9,9 +10,13 @@
 #include <algorithm>
 #include <array>
 #include <cerrno>
+#include <chrono>
 #include <climits>
+#include <csignal>
+#include <cstdint>
 #include <cstdlib>
 #include <cstring>
+#include <ctime>
 #include <memory>
 #include <optional>
 
@@ -22,6 +27,12 @@
 namespace owner {
 
 namespace {
+
+constexpr uid_t kRootUid = 0;
+constexpr auto kSameUid = static_cast<uid_t>(-1);
+
+// The owner may stop the child, whose ids are the owner's, and a file system may not answer.
+constexpr std::chrono::seconds kLongestLook(5);
 
 std::string DescriptorPath(int fd) {
   return "/proc/self/fd/" + std::to_string(fd);
@@ -38,6 +49,21 @@ std::optional<std::string> PathOf(int fd) {
   return std::string(path.data(), static_cast<size_t>(length));
 }
 
+// Another program may hold a lease on the file, as file servers do for their clients, and is told
+// now to give it back: waited for, but not for as long as it likes.
+common::UniqueFd OpenForReading(const std::string& path) {
+  constexpr int kTries = 20;
+  constexpr timespec kPause{0, 100L * 1000 * 1000};
+  for (int tries = 0; tries < kTries; ++tries) {
+    common::UniqueFd file(open(path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC));
+    if (file.get() >= 0 || errno != EWOULDBLOCK) {
+      return file;
+    }
+    nanosleep(&kPause, nullptr);
+  }
+  return {};
+}
+
 // Opened as a mere place first: opening a device or a pipe for reading may do something.
 std::optional<std::string> ReadableFile(const std::string& path) {
   const common::UniqueFd place(open(path.c_str(), O_PATH | O_CLOEXEC));
@@ -45,7 +71,7 @@ std::optional<std::string> ReadableFile(const std::string& path) {
   if (place.get() < 0 || fstat(place.get(), &st) != 0 || !S_ISREG(st.st_mode)) {
     return std::nullopt;
   }
-  const common::UniqueFd file(open(DescriptorPath(place.get()).c_str(), O_RDONLY | O_CLOEXEC));
+  const common::UniqueFd file = OpenForReading(DescriptorPath(place.get()));
   return file.get() < 0 ? std::nullopt : PathOf(file.get());
 }
 
@@ -87,16 +113,59 @@ FileAnswer Look(const std::string& path, const std::vector<std::string>& folders
   _exit(common::WriteAll(answer_fd, std::string(1, code) + resolved) ? 0 : 1);
 }
 
-std::string ReadToEnd(int fd) {
-  std::string text;
-  std::array<char, PATH_MAX> piece{};
+using Clock = std::chrono::steady_clock;
+
+// Whether there is something to read, or the end, before the deadline.
+bool WaitFor(int fd, Clock::time_point deadline) {
   for (;;) {
+    const auto left = std::chrono::ceil<std::chrono::milliseconds>(deadline - Clock::now());
+    pollfd wanted{fd, POLLIN, 0};
+    const int ready = poll(&wanted, 1, static_cast<int>(std::max<std::int64_t>(left.count(), 0)));
+    if (ready >= 0 || errno != EINTR) {
+      return ready > 0;
+    }
+  }
+}
+
+// False when the end did not come in time.
+bool ReadToEnd(int fd, std::string* text) {
+  const Clock::time_point deadline = Clock::now() + kLongestLook;
+  std::array<char, PATH_MAX> piece{};
+  while (WaitFor(fd, deadline)) {
     const ssize_t count = read(fd, piece.data(), piece.size());
     if (count > 0) {
-      text.append(piece.data(), static_cast<size_t>(count));
+      text->append(piece.data(), static_cast<size_t>(count));
     } else if (count == 0 || errno != EINTR) {
-      return text;
+      return count == 0;
     }
+  }
+  errno = ETIMEDOUT;
+  return false;
+}
+
+// The child has the owner's ids by now, so that it may be for root alone to end it.
+void Kill(pid_t child) {
+  if (kill(child, SIGKILL) == 0 || errno != EPERM) {
+    return;
+  }
+  const uid_t former = geteuid();
+  if (setresuid(kSameUid, kRootUid, kSameUid) != 0) {
+    return;
+  }
+  (void)kill(child, SIGKILL);
+  if (setresuid(kSameUid, former, kSameUid) != 0 || geteuid() != former) {
+    syslog(LOG_AUTH | LOG_CRIT, "shareable_file:%d cannot return to uid %u", __LINE__, former);
+    std::abort();
+  }
+}
+
+// One that was killed in a system call that nothing interrupts, on a file system that has gone, is
+// not waited for: it ends when that does.
+void Reap(pid_t child) {
+  constexpr int kTries = 100;
+  constexpr timespec kPause{0, 10L * 1000 * 1000};
+  for (int tries = 0; tries < kTries && waitpid(child, nullptr, WNOHANG) == 0; ++tries) {
+    nanosleep(&kPause, nullptr);
   }
 }
 
@@ -141,7 +210,14 @@ FileAnswer CheckShareable(const std::string& path, const Account& owner,
     return CannotTell(__LINE__);
   }
   write_end = common::UniqueFd();
-  const std::string text = ReadToEnd(read_end.get());
+  std::string text;
+  if (!ReadToEnd(read_end.get(), &text)) {
+    const int error = errno;
+    Kill(child);
+    Reap(child);
+    errno = error;
+    return CannotTell(__LINE__);
+  }
   if (!EndedWell(child) || text.empty()) {
     return CannotTell(__LINE__);
   }

@@ -13,15 +13,17 @@ enum class FileAnswer {
   kMay,
   kNotReadable,  // not there, no regular file, or the owner's account may not read it
   kOutside,      // below none of the folders
-  kCannotTell,   // this process cannot take the owner's identity (logged)
+  kCannotTell,   // the owner's identity cannot be taken, or it took too long (logged)
 };
 
 // Looks at `path` with the ids and groups of `owner`, in a child process: the answer is the
 // kernel's own, access lists and the like included. `resolved` is the file's path without symbolic
 // links and "..", as the kernel has it for the file that was looked at, and is set with kMay alone.
 // A process that cannot become somebody else (root is none of its ids) can tell for its own user
-// only. A folder that does not exist admits nothing. Makes and reaps a child; forbidden while
-// another thread runs.
+// only. A folder that does not exist admits nothing. A file on
+// which somebody holds a lease for 2 seconds longer is not readable, and after 5 seconds the child
+// is killed: the owner can stop it, and whoever calls is not to wait for that. Makes and reaps a
+// child; forbidden while another thread runs.
 FileAnswer CheckShareable(const std::string& path, const Account& owner,
                           const std::vector<std::string>& folders, std::string* resolved);
 

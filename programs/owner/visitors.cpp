@@ -23,12 +23,15 @@ void OfLink(const Entry& link, std::time_t now, Condition* condition) {
   condition->Where("timeout >= " + std::to_string(now));
 }
 
-Visitor VisitorOf(const Session& session, const Token& token) {
+// A session carries the account that it proved last, at whatever link: at one that asks for no
+// account, its owner has no business to know it.
+Visitor VisitorOf(const Entry& link, const Session& session, const Token& token) {
   Visitor visitor;
   visitor.ip = session.get_ip();
   visitor.expires_at = token.get_timeout();
   std::string name;
-  if (TUVO::sharing::UIDToUser(session.get_uid(), name)) {
+  if (link.get_protect_type() == Entry::PROTECT_USER &&
+      TUVO::sharing::UIDToUser(session.get_uid(), name)) {
     visitor.user = name;
   }
   return visitor;
@@ -54,7 +57,7 @@ MaybeProblem ListVisitors(BaseDB& db, const Entry& link, int most, std::time_t n
   for (const Token& token : found) {
     Session session;
     if (sessions.GetById(token.get_session_id(), session)) {
-      visitors->push_back(VisitorOf(session, token));
+      visitors->push_back(VisitorOf(link, session, token));
     }
   }
   return std::nullopt;

@@ -16,7 +16,7 @@ namespace owner {
 // Nothing of the visitor's session that would open anything.
 struct Visitor {
   std::string ip;
-  std::string user;  // empty: a stranger, or an account that is gone
+  std::string user;  // empty: a stranger, an account that is gone, a link that asks for none
   std::time_t expires_at = 0;
 };
 

@@ -2,6 +2,10 @@
 
 #include <tuvosharing/keys.h>
 
+#include <algorithm>
+#include <iterator>
+#include <utility>
+
 #include "visitor/html.h"
 #include "visitor/route.h"
 
@@ -38,6 +42,53 @@ namespace {
 
 constexpr std::string_view kUntitled = "Shared link";
 constexpr std::string_view kComplaintId = "complaint";
+
+struct Range {
+  char32_t first;
+  char32_t last;
+};
+
+// Blanks, controls and what shapes other characters without being seen itself.
+constexpr Range kInvisible[] = {
+    {0x00, 0x20},       {0x7f, 0xa0},       {0xad, 0xad},     {0x34f, 0x34f},   {0x61c, 0x61c},
+    {0x115f, 0x1160},   {0x1680, 0x1680},   {0x17b4, 0x17b5}, {0x180b, 0x180f}, {0x2000, 0x200f},
+    {0x2028, 0x202f},   {0x205f, 0x206f},   {0x2800, 0x2800}, {0x3000, 0x3000}, {0x3164, 0x3164},
+    {0xfe00, 0xfe0f},   {0xfeff, 0xfeff},   {0xffa0, 0xffa0}, {0xfff0, 0xfffb}, {0x1bca0, 0x1bca3},
+    {0x1d173, 0x1d17a}, {0xe0000, 0xe0fff},
+};
+
+bool IsVisible(char32_t character) {
+  return std::none_of(std::begin(kInvisible), std::end(kInvisible), [character](Range range) {
+    return range.first <= character && character <= range.last;
+  });
+}
+
+// The character of UTF-8 at the start of a text, and how long it is; a stray byte is one by itself.
+std::pair<char32_t, size_t> FirstCharacter(std::string_view text) {
+  const auto byte = [text](size_t at) { return static_cast<unsigned char>(text[at]); };
+  const unsigned char lead = byte(0);
+  const size_t length = lead >= 0xf0 ? 4 : lead >= 0xe0 ? 3 : lead >= 0xc0 ? 2 : 1;
+  if (length == 1 || length > text.size()) {
+    return {lead < 0x80 ? lead : U'\ufffd', 1};
+  }
+  char32_t character = lead & (0x7fU >> length);
+  for (size_t at = 1; at < length; ++at) {
+    character = character << 6U | (byte(at) & 0x3fU);
+  }
+  return {character, length};
+}
+
+// A heading that shows nothing leaves visitors, and screen readers above all, without one.
+bool HasVisible(std::string_view text) {
+  while (!text.empty()) {
+    const auto [character, length] = FirstCharacter(text);
+    if (IsVisible(character)) {
+      return true;
+    }
+    text.remove_prefix(length);
+  }
+  return false;
+}
 
 std::string Document(std::string_view title, const std::string& content) {
   return "<!DOCTYPE html>\n<html lang=\"en\">\n<head>\n<meta charset=\"utf-8\">\n"
@@ -131,7 +182,7 @@ std::string FormHtml(const AdmissionForm& form) {
         "<input type=\"hidden\" name=\"" + std::string(kRedirectParameter) + "\" value=\"1\">\n";
   }
   content += Button("Open", form.ask == Ask::kNothing) + "</form>\n";
-  return Document(form.title.empty() ? kUntitled : form.title, content);
+  return Document(HasVisible(form.title) ? form.title : kUntitled, content);
 }
 
 std::string NoticeHtml(const NoticePage& page) {

@@ -51,8 +51,11 @@ std::optional<std::string> HeadOf(const Answer& answer, TUVOCGI* cgi) {
   return head.append(kLineEnd);
 }
 
-bool SendFile(const FilePiece& file, common::Exchange* exchange) {
-  const bool whole = exchange->WriteFile(file.fd.get(), file.offset, file.length);
+// What is written may wait in a buffer: only the end tells whether all of it got out.
+bool SendFile(const FilePiece& file, std::string_view head, common::Exchange* exchange) {
+  const bool whole = exchange->Write(head) &&
+                     exchange->WriteFile(file.fd.get(), file.offset, file.length) &&
+                     exchange->Finish();
   LogDownload(file.link, whole);
   return whole;
 }
@@ -60,13 +63,13 @@ bool SendFile(const FilePiece& file, common::Exchange* exchange) {
 // A visitor who goes away in the middle is no error.
 bool Send(const Answer& answer, bool with_body, TUVOCGI* cgi, common::Exchange* exchange) {
   const std::optional<std::string> head = HeadOf(answer, cgi);
-  if (!head || !exchange->Write(*head)) {
+  if (!head) {
     return false;
   }
-  if (!with_body) {
-    return true;
+  if (with_body && answer.file) {
+    return SendFile(*answer.file, *head, exchange);
   }
-  return answer.file ? SendFile(*answer.file, exchange) : exchange->Write(answer.body);
+  return exchange->Write(*head) && (!with_body || exchange->Write(answer.body));
 }
 
 Answer AnswerTo(const Request& request, Context* context) {

@@ -1,21 +1,62 @@
 // The dialogs about one link, and the questions. All are <dialog> elements shown as modal: the
-// browser keeps the focus inside and closes them with Escape.
+// browser keeps the focus inside.
 
 import * as api from "./api.js";
 import * as clock from "./clock.js";
-import {byId, element, isUsable, say, setUsable} from "./dom.js";
+import {byId, element, isolated, isUsable, say, setUsable} from "./dom.js";
+import * as notice from "./notice.js";
 import * as texts from "./texts.js";
+
+let wanted = 0;                 // what somebody asked to see last
+const openings = new WeakMap(); // by dialog, how often it was opened and closed
+
+const current = (dialog) => openings.get(dialog) ?? 0;
+const turn = (dialog) => openings.set(dialog, current(dialog) + 1);
+
+export const isAnyOpen = () => document.querySelector("dialog[open]") !== null;
+
+// For what is shown once an answer has come: the function returned says whether it is still wanted,
+// or whether something else was asked for or opened meanwhile.
+export function want() {
+  const mine = ++wanted;
+  return () => mine === wanted && !isAnyOpen();
+}
+
+// Whether the dialog is still open as it is now: not closed since, nor opened for something else.
+export function stillOpen(dialog) {
+  const opening = current(dialog);
+  return () => dialog.open && opening === current(dialog);
+}
 
 // `comeBack` puts the focus where it belongs once the dialog is closed; without it the browser
 // gives it back to the element that had it.
 export function open(dialog, comeBack = undefined) {
-  dialog.addEventListener("close", () => comeBack?.(), {once: true});
+  wanted++;
+  turn(dialog);
+  dialog.addEventListener("close", () => {
+    turn(dialog);
+    comeBack?.();
+  }, {once: true});
   dialog.showModal();
+}
+
+// Takes the key from the browser, which closes two dialogs with one press where the second was not
+// opened by a press of its own. The last function that a dialog was given counts.
+export function onEscape(dialog, leave) {
+  dialog.onkeydown = (event) => {
+    if (event.key === "Escape") {
+      event.preventDefault();
+      leave();
+    }
+  };
 }
 
 export function start() {
   for (const button of document.querySelectorAll("dialog [data-close]")) {
     button.addEventListener("click", () => button.closest("dialog").close());
+  }
+  for (const dialog of document.querySelectorAll("dialog")) {
+    onEscape(dialog, () => dialog.close());
   }
   byId("copy-address").addEventListener("click", copyShownAddress);
   byId("address").addEventListener("focus", () => byId("address").select());
@@ -27,7 +68,7 @@ export function start() {
 export const addressOf = (answer) =>
     answer.url || new URL("/sharing/" + answer.link.hash, location.origin).href;
 
-const guessed = (answer) => answer.url
+export const guessed = (answer) => answer.url
     ? ""
     : "The server does not know its own address; this one is made from the address of this page.";
 
@@ -67,7 +108,7 @@ selected: copy it with the keyboard (Ctrl+C) or the context menu.";
 
 // Shows the address of a link, from an answer of the methods create, get and set.
 export function showAddress(answer, {heading, status = "", selected = false, comeBack}) {
-  byId("address-heading").textContent = heading;
+  byId("address-heading").replaceChildren(...heading);
   byId("address").value = addressOf(answer);
   byId("address-status").textContent = status;
   say(byId("address-note"), guessed(answer));
@@ -98,23 +139,30 @@ export async function showVisitors(link, comeBack) {
   const rows = byId("visitors-rows");
   rows.replaceChildren();
   byId("visitors-scroll").hidden = true;
-  byId("visitors-heading").textContent = "Visitors of " + texts.linkName(link);
+  byId("visitors-heading").replaceChildren("Visitors of ", ...texts.quoted(link));
   byId("visitors-count").textContent = "Loading…";
   open(byId("visitors-dialog"), comeBack);
+  const isWanted = stillOpen(byId("visitors-dialog"));
   try {
     const answer = await api.link("sessions", {id: link.id});
+    if (!isWanted()) {
+      return;
+    }
     byId("visitors-scroll").hidden = answer.sessions.length === 0;
     rows.replaceChildren(...answer.sessions.map(visitorRow));
     byId("visitors-count").textContent = visitorsCount(answer);
   } catch (error) {
-    byId("visitors-count").textContent = texts.describe(error);
+    if (isWanted()) {
+      byId("visitors-count").textContent = texts.describe(error);
+    }
   }
 }
 
 function visitorRow(session) {
   const cell = (text) => element("td", {role: "cell", class: "wraps"}, text);
   return element("tr", {role: "row"},
-                 element("th", {role: "rowheader", scope: "row"}, session.user || "A stranger"),
+                 element("th", {role: "rowheader", scope: "row"},
+                         session.user ? isolated(session.user) : "A stranger"),
                  cell(session.ip), cell(clock.shown(session.expires_at)));
 }
 
@@ -131,34 +179,51 @@ function visitorsCount(answer) {
 // ---- questions ----
 
 // Asks before something that cannot be taken back. `act` does it and may fail; the dialog stays
-// open then, and says why.
-export function ask({heading, text, yes, act, comeBack}) {
+// open then, and says why. `heading` and `text` are lists of texts and elements.
+export function ask({heading, text, yes, no = "Cancel", act, after, comeBack}) {
   const dialog = byId("question-dialog");
   const button = byId("question-yes");
-  byId("question-heading").textContent = heading;
-  byId("question-text").textContent = text;
-  say(byId("question-problem"), "");
+  const problem = byId("question-problem");
+  byId("question-heading").replaceChildren(...heading);
+  byId("question-text").replaceChildren(...text);
+  say(problem, "");
   button.textContent = yes;
+  byId("question-no").textContent = no;
   setUsable(button, true);
-  button.onclick = () => attempt(dialog, button, byId("question-problem"), act);
+  button.onclick = () => attempt({dialog, button, problem, act, after});
   open(dialog, comeBack);
 }
 
 // Does what a dialog's button is for and closes the dialog; when it fails the dialog says why. What
-// is to be said on the page comes in `after`: under an open dialog no screen reader hears it.
-export async function attempt(dialog, button, problem, act, after = () => {}) {
+// is to be said on the page comes in `after`: under an open dialog no screen reader hears it. The
+// answer may come after the dialog was closed, or opened for something else: then it touches none
+// of that, and a failure is told on the page.
+export async function attempt({
+  dialog,
+  button,
+  problem,
+  act,
+  after = () => {},
+  release = () => setUsable(button, true),
+}) {
   if (!isUsable(button)) {
     return;
   }
+  const isWanted = stillOpen(dialog);
   setUsable(button, false);
   say(problem, "");
   try {
     const result = await act();
-    dialog.close();
+    if (isWanted()) {
+      dialog.close();
+    }
     after(result);
   } catch (error) {
-    say(problem, texts.describe(error));
-  } finally {
-    setUsable(button, true);
+    if (isWanted()) {
+      say(problem, texts.describe(error));
+      release();
+    } else {
+      notice.show(texts.describe(error));
+    }
   }
 }

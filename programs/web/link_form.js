@@ -1,11 +1,14 @@
-// The form for everything that a link can hold. What it sends is the difference to what it showed
-// first: a value that nobody touched is not written back over what others change meanwhile, such as
-// the count of uses.
+// The form for everything that a link can hold. It sends the fields that hold something else than
+// when they were filled: what nobody touched is not written back, neither over what others change
+// meanwhile, such as the count of uses, nor in the shape that a field makes of it, which drops line
+// feeds.
 
 import * as api from "./api.js";
 import * as clock from "./clock.js";
-import {open} from "./dialogs.js";
+import {ask, onEscape, open, stillOpen} from "./dialogs.js";
 import {byId, isUsable, say, setUsable} from "./dom.js";
+import {inexactNumber} from "./json_numbers.js";
+import * as notice from "./notice.js";
 import * as texts from "./texts.js";
 
 const LARGEST_NUMBER = 2147483647;
@@ -40,18 +43,31 @@ const BLANK = {
 
 const encoder = new TextEncoder();
 const lines = (text) => text.split("\n").map((line) => line.trim()).filter((line) => line !== "");
-const same = (one, other) => JSON.stringify(one) === JSON.stringify(other);
 const isFile = () => byId("project_name").value.trim() === texts.FILE_PROJECT;
 const protectType = () =>
     document.querySelector("input[name=protect_type]:checked")?.value ?? "none";
 
 let link = BLANK;   // the one being edited
-let initial = {};   // the form's values when it was opened
+let inexact;        // a number of its data that the browser cannot hold
+let initial = {};   // what the fields held when they were filled
+let isSaving = false;
 let saved;          // to be called with the answer
 
 class Mistake extends Error {}
 
 // ---- reading ----
+
+// What a field holds, as it holds it.
+function raw(field) {
+  if (field === "protect_type") {
+    return protectType();
+  }
+  return byId(field).type === "checkbox" ? byId(field).checked : byId(field).value;
+}
+
+const rawValues = () => Object.fromEntries(FIELDS.map((field) => [field, raw(field)]));
+const isTouched = (field) => raw(field) !== initial[field] || byId(field).validity?.badInput;
+const isChanged = () => FIELDS.some(isTouched);
 
 function readNumber(id) {
   const text = byId(id).value.trim();
@@ -84,6 +100,11 @@ function readObject(id) {
   }
   if (value === null || typeof value !== "object" || Array.isArray(value)) {
     throw new Mistake("This is JSON, but not an object: it begins with { and ends with }.");
+  }
+  const number = inexactNumber(text);
+  if (number !== undefined) {
+    throw new Mistake(`No browser can keep the number ${number} as it is. Write it as a text, in \
+quotation marks, or use the command line.`);
   }
   return value;
 }
@@ -130,6 +151,23 @@ function readEnd() {
   return end;
 }
 
+function readOwner() {
+  const owner = byId("owner_user").value.trim();
+  if (owner === "") {
+    throw new Mistake("Every link has an owner.");
+  }
+  return owner;
+}
+
+// A link that is given this protection must not fall back on a password that it once had.
+function readPassword() {
+  const password = byId("protect_password").value;
+  if (password === "") {
+    throw new Mistake("Which password is it to have?");
+  }
+  return password;
+}
+
 function readRedirect() {
   const uri = byId("redirect_uri").value.trim();
   if (uri === "" && byId("redirect_type").value !== "none") {
@@ -138,48 +176,69 @@ function readRedirect() {
   return uri;
 }
 
-// By the names of the API; `at` is the field that shows a mistake.
-function readers() {
-  const all = {
-    project_name: readProject,
-    owner_user: () => byId("owner_user").value.trim(),
-    app: isFile() ? readPath : () => readObject("app"),
-    protect_title: readTitle,
-    enabled: () => byId("enabled").checked,
-    protect_type: protectType,
-    enable_match_ip: () => byId("enable_match_ip").checked,
-    start_at: () => readTime("start_at"),
-    expire_at: readEnd,
-    expire_times: () => readNumber("expire_times"),
-    use_count: () => readNumber("use_count"),
-    auto_gc: () => byId("auto_gc").checked,
-    hash: readHash,
-    redirect_type: () => byId("redirect_type").value,
-    redirect_uri: readRedirect,
-  };
-  if (protectType() === "password") {
-    all.protect_password = () => byId("protect_password").value;
-  }
-  if (protectType() === "user") {
-    all.protect_users = () => lines(byId("protect_users").value);
-    all.protect_groups = () => lines(byId("protect_groups").value);
-  }
-  // Never shown, so an empty field means nothing.
-  if (byId("private_data").value.trim() !== "") {
-    all.private_data = () => readObject("private_data");
-  }
-  return all;
-}
+const READERS = {
+  project_name: readProject,
+  owner_user: readOwner,
+  app: () => isFile() ? readPath() : readObject("app"),
+  protect_title: readTitle,
+  enabled: () => byId("enabled").checked,
+  protect_type: protectType,
+  protect_password: readPassword,
+  protect_users: () => lines(byId("protect_users").value),
+  protect_groups: () => lines(byId("protect_groups").value),
+  enable_match_ip: () => byId("enable_match_ip").checked,
+  start_at: () => readTime("start_at"),
+  expire_at: readEnd,
+  expire_times: () => readNumber("expire_times"),
+  use_count: () => readNumber("use_count"),
+  auto_gc: () => byId("auto_gc").checked,
+  hash: readHash,
+  redirect_type: () => byId("redirect_type").value,
+  redirect_uri: readRedirect,
+  private_data: () => readObject("private_data"),
+};
 
 const fieldOf = (argument) => argument === "app" && isFile() ? "path" : argument;
+const isNew = () => link.id === 0;
 
-// The values by name, and the mistakes by field.
+// What a field that nobody touched has to be looked at for: it may be wrong now that others differ.
+const NEEDED = {
+  project_name: isNew,
+  app: () => isFile() && (isNew() || isTouched("project_name")),
+  protect_password: () => protectType() === "password" && link.protect_type !== "password",
+  expire_at: () => isTouched("start_at"),
+  redirect_uri: () => isTouched("redirect_type"),
+};
+
+// Fields that the other choices have put out of sight say nothing.
+function counts(argument) {
+  switch (argument) {
+    case "protect_password":
+      return protectType() === "password";
+    case "protect_users":
+    case "protect_groups":
+      return protectType() === "user";
+    case "private_data": // never shown, so an empty field means nothing
+      return byId("private_data").value.trim() !== "";
+    default:
+      return true;
+  }
+}
+
+// What is to be sent, by the API's names, and the mistakes by field.
 function read() {
-  const values = {};
+  const settings = {};
   const mistakes = {};
-  for (const [argument, value] of Object.entries(readers())) {
+  for (const [argument, value] of Object.entries(READERS)) {
+    const touched = isTouched(fieldOf(argument));
+    if (!counts(argument) || !(touched || NEEDED[argument]?.())) {
+      continue;
+    }
     try {
-      values[argument] = value();
+      const found = value();
+      if (touched || argument === "project_name") {
+        settings[argument] = found;
+      }
     } catch (error) {
       if (!(error instanceof Mistake)) {
         throw error;
@@ -187,35 +246,15 @@ function read() {
       mistakes[fieldOf(argument)] = error.message;
     }
   }
-  return {values, mistakes};
-}
-
-// What is to be sent: what differs from the beginning.
-function changes(values) {
-  const settings = {};
-  for (const [argument, value] of Object.entries(values)) {
-    if (!same(value, initial[argument])) {
-      settings[argument] = value;
-    }
-  }
-  if (settings.protect_password === "") {
-    delete settings.protect_password;
-  }
-  if (link.id === 0) {
-    settings.project_name = values.project_name;
-    if (settings.hash === "") {
-      delete settings.hash;
-    }
-  }
-  if (settings.owner_user === "") {
-    delete settings.owner_user;
-  }
   // A password or a list says by itself which protection it means; that shall be the one shown.
   if ("protect_password" in settings || "protect_users" in settings ||
       "protect_groups" in settings) {
-    settings.protect_type = values.protect_type;
+    settings.protect_type = protectType();
   }
-  return settings;
+  if (settings.hash === "") {
+    delete settings.hash; // one is drawn
+  }
+  return {settings, mistakes};
 }
 
 // ---- showing ----
@@ -246,16 +285,28 @@ function fill() {
   set("redirect_type", link.redirect_type);
   set("redirect_uri", link.redirect_uri);
   set("private_data", "");
+  byId("app").readOnly = byId("path").readOnly = inexact !== undefined;
 }
+
+// Whatever else is changed, the data is left as it is.
+const whyReadOnly = () => `Cannot be changed here: its number ${inexact} is one that no browser \
+can keep as it is. The command line can.`;
 
 function showHelp(shareFolders) {
   const made = link.id !== 0;
-  byId("path-help").textContent = shareFolders.length === 0
+  byId("app-help").textContent =
+      inexact === undefined ? "A JSON object, like {\"album\": 7}." : whyReadOnly();
+  byId("path-help").textContent = inexact !== undefined ? whyReadOnly()
+      : shareFolders.length === 0
       ? "Its whole path on the server."
       : "Its whole path on the server, below " + shareFolders.join(" or ") + ".";
   byId("protect_password-help").textContent = made && link.protect_type === "password"
       ? "Never shown. Leave it empty to keep the one that the link has."
       : "Never shown again; visitors get it from you.";
+  byId("protect_users-help").textContent = "One name a line." + (made
+      ? " Accounts that are gone are not shown; changing the list drops them." : "");
+  byId("protect_groups-help").textContent = "One name a line." + (made
+      ? " Groups that are gone are not shown; changing the list drops them." : "");
   byId("private_data-help").textContent = made
       ? "A JSON object for the application, never shown. Leave it empty to keep what the link has; \
 {} removes it."
@@ -263,8 +314,25 @@ function showHelp(shareFolders) {
   byId("hash-help").textContent = made
       ? "Another one makes the address that people have useless."
       : "Leave it empty to have one drawn that nobody can guess.";
+  showClock();
+}
+
+function showClock() {
   byId("server-clock").textContent =
       "The server’s clock: " + clock.shown(clock.toField(clock.now())).replace("T", " ") + ".";
+}
+
+// The page may be hours old, and the machine may have slept.
+async function renewClock() {
+  const isWanted = stillOpen(byId("link-dialog"));
+  try {
+    clock.setNow((await api.info()).now);
+  } catch {
+    return; // what the clock went on to is the best there is
+  }
+  if (isWanted()) {
+    showClock();
+  }
 }
 
 // Fields that make no sense with the other choices are not there.
@@ -329,41 +397,86 @@ async function save(event) {
   if (!isUsable(byId("save-link"))) {
     return;
   }
-  const {values, mistakes} = read();
+  const {settings, mistakes} = read();
   if (Object.keys(mistakes).length > 0) {
     showMistakes(mistakes);
     return;
   }
   clearMistakes();
-  const settings = changes(values);
-  if (link.id !== 0 && Object.keys(settings).length === 0) {
+  if (!isNew() && Object.keys(settings).length === 0) {
     byId("link-dialog").close();
     return;
   }
+  await send(isNew() ? "create" : "set", isNew() ? settings : {id: link.id, ...settings});
+}
+
+// When the form was closed meanwhile, or opened for another link, the answer is for the page alone.
+async function send(method, settings) {
+  const isOpen = stillOpen(byId("link-dialog"));
+  const name = texts.quoted(link);
+  isSaving = true;
   setUsable(byId("save-link"), false);
+  let answer;
   try {
-    const answer = link.id === 0 ? await api.link("create", settings)
-                                 : await api.link("set", {id: link.id, ...settings});
-    saved(answer, link.id === 0);
+    answer = await api.link(method, settings);
   } catch (error) {
-    const text = texts.describe(error);
-    if (error.field) {
-      showMistakes({[fieldOf(error.field)]: text});
+    if (isOpen()) {
+      isSaving = false;
+      setUsable(byId("save-link"), true);
+      refused(error);
     } else {
-      showMistakes({}, text);
+      notice.show(method === "create" ? ["The new link: ", texts.describe(error)]
+                                      : [...name, ": ", texts.describe(error)]);
     }
-  } finally {
-    setUsable(byId("save-link"), true);
+    return;
+  }
+  const wasOpen = isOpen();
+  if (wasOpen) {
+    byId("link-dialog").close();
+  }
+  saved(answer, {isNew: method === "create", isOpen: wasOpen});
+}
+
+function refused(error) {
+  const text = texts.describe(error);
+  if (error.field) {
+    showMistakes({[fieldOf(error.field)]: text});
+  } else {
+    showMistakes({}, text);
   }
 }
 
-// `whenSaved` is called with the API's answer and whether the link is new.
+// What was typed is not lost by one press. Once it is on its way there is nothing to be lost.
+function leave() {
+  if (isSaving || !isChanged()) {
+    byId("link-dialog").close();
+    return;
+  }
+  ask({
+    heading: ["Discard what you changed?"],
+    text: ["Nothing of it is saved yet."],
+    yes: "Discard",
+    no: "Keep editing",
+    act: async () => {},
+    after: () => byId("link-dialog").close(),
+  });
+}
+
+// `whenSaved` is called with the API's answer, and with whether the link is new and whether the
+// form was still open for it.
 export function start(whenSaved) {
   saved = whenSaved;
   const form = byId("link-form");
   form.addEventListener("submit", save);
   form.addEventListener("input", adapt);
   form.addEventListener("change", adapt);
+  byId("cancel-link").addEventListener("click", leave);
+  onEscape(byId("link-dialog"), leave);
+  // Where there is another way than the key, such as a gesture. Browsers let this be held back once.
+  byId("link-dialog").addEventListener("cancel", (event) => {
+    event.preventDefault();
+    leave();
+  });
   for (const button of form.querySelectorAll("[data-days]")) {
     button.addEventListener("click", () => {
       const days = button.dataset.days;
@@ -372,28 +485,24 @@ export function start(whenSaved) {
   }
 }
 
-// Without a link it is the form for a new one. `about` is what the API says about itself.
-export function edit(edited, about, comeBack) {
+// Without a link it is the form for a new one. `about` is what the API says about itself; `number`
+// is one of the link's that the browser cannot hold.
+export function edit(edited, about, {inexact: number, comeBack} = {}) {
   link = {...BLANK, owner_user: about.account.user, ...edited};
-  byId("link-heading").textContent =
-      edited ? "Edit " + texts.linkName(link) : "New link";
+  inexact = number;
+  byId("link-heading").replaceChildren(
+      ...(edited ? ["Edit ", ...texts.quoted(link)] : ["New link"]));
   byId("save-link").textContent = edited ? "Save" : "Create link";
   byId("owner_user-field").hidden = !about.account.administrator;
   byId("more").open = false;
   fill();
+  isSaving = false;
+  setUsable(byId("save-link"), true);
   clearMistakes();
   showHelp(about.share_folders);
   adapt();
-  initial = snapshot();
+  initial = rawValues();
   open(byId("link-dialog"), comeBack);
   byId(edited ? "protect_title" : isFile() ? "path" : "project_name").focus();
-}
-
-// The values as the link has them, in the form that `read` gives them.
-function snapshot() {
-  return {
-    ...link,
-    start_at: link.start_at.replace(" ", "T"),
-    expire_at: link.expire_at.replace(" ", "T"),
-  };
+  renewClock();
 }

@@ -1,7 +1,7 @@
 // The table of links. Its roles are written out, because browsers take a table that is laid out as
 // cards for no table.
 
-import {byId, element, unseen} from "./dom.js";
+import {byId, element, isolated, unseen} from "./dom.js";
 import * as texts from "./texts.js";
 
 const COLUMNS = [
@@ -90,9 +90,9 @@ export class LinkTable {
     const cells = {
       "No.": () => this.cell("No.", {}, String(link.id)),
       Title: () => this.title(link),
-      Project: () => this.cell("Project", {class: "wraps"}, link.project_name),
+      Project: () => this.cell("Project", {class: "wraps"}, isolated(link.project_name)),
       Address: () => this.cell("Address", {class: "code"}, link.hash),
-      Owner: () => this.cell("Owner", {class: "wraps"}, texts.owner(link)),
+      Owner: () => this.cell("Owner", {class: "wraps"}, isolated(texts.owner(link))),
       State: () => this.state(link),
       Uses: () => this.cell("Uses", {class: "count"}, texts.uses(link)),
       Ends: () => this.end(link),
@@ -109,11 +109,11 @@ export class LinkTable {
 
   title(link) {
     const name = texts.linkName(link);
-    const button = this.button(link, "edit", "text", unseen("Edit "), name);
+    const button = this.button(link, "edit", "text", unseen("Edit "), isolated(name));
     const content = element("div", {}, button);
     const path = texts.path(link);
     if (path) {
-      content.append(element("span", {class: "below"}, path));
+      content.append(element("span", {class: "below"}, isolated(path)));
     }
     content.append(element("span", {class: "below"}, texts.protection(link)));
     return element("th", {role: "rowheader", scope: "row", "data-label": "Title"}, content);

@@ -37,6 +37,13 @@ const table = new LinkTable({
 
 // ---- the list ----
 
+// A view that comes from an address may ask for what this account cannot.
+function adopt(found) {
+  view = about.account.administrator ? found : {...found, owner: ""};
+  viewState.write(view);
+  fillFilters();
+}
+
 // Shows another part of the list, and remembers it in the address.
 function show(changes) {
   view = {...view, ...changes};
@@ -61,7 +68,7 @@ async function load() {
     render(answer, lastPage);
   } catch (error) {
     if (!mine.signal.aborted) {
-      showProblem(error);
+      showLoadProblem(error);
     }
   } finally {
     if (loading === mine) {
@@ -73,9 +80,8 @@ async function load() {
 function render(answer, lastPage) {
   clock.setNow(answer.now);
   byId("problem").hidden = true;
-  byId("links").hidden = false;
-  byId("new-link").hidden = false;
-  showClear();
+  showFilterErrors();
+  showFrame();
   learnProjects(answer.links);
   table.render(answer.links, view);
   const isEmpty = answer.links.length === 0;
@@ -124,6 +130,39 @@ function readFilters() {
   show(changes);
 }
 
+// What is there whatever the list is like: without it nobody could change the filters back.
+function showFrame() {
+  byId("links").hidden = false;
+  byId("new-link").hidden = false;
+  byId("columns").closest("table").hidden = byId("rows").childElementCount === 0;
+  showClear();
+}
+
+// `errors` by the filters' names in the API.
+function showFilterErrors(errors = {}) {
+  for (const [name, id] of Object.entries(FILTER_FIELDS)) {
+    const text = errors[viewState.ARGUMENTS[name]] ?? "";
+    say(byId(id + "-error"), text);
+    if (text === "") {
+      byId(id).removeAttribute("aria-invalid");
+    } else {
+      byId(id).setAttribute("aria-invalid", "true");
+    }
+  }
+}
+
+function showLoadProblem(error) {
+  showFrame();
+  const isFilters = Object.values(viewState.ARGUMENTS).includes(error.field);
+  byId("problem").hidden = isFilters || byId("problem").hidden;
+  showFilterErrors(isFilters ? {[error.field]: texts.describe(error)} : {});
+  if (isFilters) {
+    byId("count").textContent = "The list is as it was: a filter needs another look.";
+  } else {
+    showProblem(error);
+  }
+}
+
 function showProblem(error) {
   const [title, text] = texts.pageProblem(error);
   byId("problem-title").textContent = title;
@@ -144,46 +183,65 @@ const backTo = (id, action) => () => {
 // The newest state of a link: the list may be hours old.
 const newest = (link, settings = {}) => api.link("get", {id: link.id, ...settings});
 
+// In notices and questions: which link it was.
+const identity = (link) => texts.identity(link, about.account.administrator);
+
+const said = (link, what) => [...texts.quoted(link), ` ${what}.`, ...identity(link)];
+
 async function editLink(link) {
+  const isWanted = dialogs.want();
   try {
     const answer = await newest(link);
-    linkForm.edit(answer.link, about, backTo(link.id, "edit"));
+    if (isWanted()) {
+      const comeBack = backTo(link.id, "edit");
+      linkForm.edit(answer.link, about, {inexact: answer.inexact, comeBack});
+    }
   } catch (error) {
     notice.show(texts.describe(error));
   }
 }
 
-async function whenSaved(answer, isNew) {
-  byId("link-dialog").close();
+// `isOpen`: whether the form was still there when the answer came.
+async function whenSaved(answer, {isNew, isOpen}) {
+  const isWanted = isOpen ? dialogs.want() : () => false;
   await load();
+  notice.show(said(answer.link, isNew ? "is created" : "is saved"));
+  if (!isWanted()) {
+    return;
+  }
   if (!isNew) {
-    notice.show(`“${texts.linkName(answer.link)}” is saved.`);
     backTo(answer.link.id, "edit")();
     return;
   }
-  notice.show(`“${texts.linkName(answer.link)}” is created.`);
   let shown = answer;
   try {
     shown = await newest(answer.link, {qr: true});
   } catch {
     // The address is there without the QR code as well.
   }
-  dialogs.showAddress(shown, {heading: "The link is created",
-                              comeBack: () => byId("new-link").focus()});
+  if (isWanted()) {
+    dialogs.showAddress(shown, {heading: ["The link is created"],
+                                comeBack: () => byId("new-link").focus()});
+  }
 }
 
 async function copyAddress(link) {
+  const isWanted = dialogs.want();
   const asked = newest(link, {qr: true});
-  const name = texts.linkName(link);
   try {
     const copied = await dialogs.copy(asked.then(dialogs.addressOf));
     const answer = await asked;
     if (copied) {
-      notice.show(`The address of “${name}” is copied.`);
+      const doubt = dialogs.guessed(answer);
+      notice.show(["The address of ", ...said(answer.link, "is copied"), doubt && " " + doubt]);
+      return;
+    }
+    if (!isWanted()) {
+      notice.show(["The address of ", ...said(answer.link, "is not copied")]);
       return;
     }
     dialogs.showAddress(answer, {
-      heading: "Address of " + name,
+      heading: ["Address of ", ...texts.quoted(answer.link)],
       status: "The browser does not let this page copy. The address is selected: copy it with the \
 keyboard (Ctrl+C) or the context menu.",
       selected: true,
@@ -195,10 +253,13 @@ keyboard (Ctrl+C) or the context menu.",
 }
 
 async function showQr(link) {
+  const isWanted = dialogs.want();
   try {
     const answer = await newest(link, {qr: true});
-    dialogs.showAddress(answer, {heading: "Address of " + texts.linkName(link),
-                                 comeBack: backTo(link.id, "qr")});
+    if (isWanted()) {
+      dialogs.showAddress(answer, {heading: ["Address of ", ...texts.quoted(answer.link)],
+                                   comeBack: backTo(link.id, "qr")});
+    }
   } catch (error) {
     notice.show(texts.describe(error));
   }
@@ -213,40 +274,43 @@ async function toggle(link, button) {
   setUsable(button, true);
 }
 
+// Somebody else may have done it already; then there is nothing of this page's to take back.
 async function setEnabled(link, enabled, withUndo) {
+  const word = enabled ? "enabled" : "disabled";
   try {
+    const before = (await newest(link)).link;
+    if (before.enabled === enabled) {
+      table.update(before);
+      notice.show(said(before, `was ${word} already`));
+      return;
+    }
     const answer = await api.link("set", {id: link.id, enabled});
     table.update(answer.link);
     const undo = () => {
       setEnabled(answer.link, !enabled, false);
       table.focus(link.id, "toggle");
     };
-    notice.show(`“${texts.linkName(link)}” is ${enabled ? "enabled" : "disabled"}` +
-                (withUndo ? "." : " again."), withUndo ? undo : null);
+    notice.show(said(answer.link, `is ${word}${withUndo ? "" : " again"}`), withUndo ? undo : null);
   } catch (error) {
     notice.show(texts.describe(error));
   }
 }
 
 function remove(link) {
-  const name = texts.linkName(link);
   const next = table.neighbour(link.id);
   let isGone = false;
   dialogs.ask({
-    heading: `Delete ${name}?`,
-    text: "Its address stops working for good, and everybody who is admitted to it is no longer.",
+    heading: ["Delete ", ...texts.quoted(link), "?"],
+    text: [...identity(link), " Its address stops working for good, and everybody who is admitted \
+to it is no longer."],
     yes: "Delete",
     act: async () => {
       await api.link("delete", {id: link.id});
       isGone = true;
       await load();
     },
-    comeBack: () => {
-      if (isGone) {
-        notice.show(`“${name}” is deleted.`);
-      }
-      (isGone ? backTo(next, "edit") : backTo(link.id, "remove"))();
-    },
+    after: () => notice.show(said(link, "is deleted")),
+    comeBack: () => (isGone ? backTo(next, "edit") : backTo(link.id, "remove"))(),
   });
 }
 
@@ -289,10 +353,12 @@ function listen() {
   });
   // An address that is changed by hand, or a bookmark.
   window.addEventListener("hashchange", () => {
-    view = viewState.read(location.hash);
-    fillFilters();
-    load();
+    if (about !== null) {
+      adopt(viewState.read(location.hash));
+      load();
+    }
   });
+  document.addEventListener(api.GONE, load);
 }
 
 async function begin() {
@@ -309,6 +375,7 @@ async function begin() {
   byId("filter-owner-field").hidden = !administrator;
   table.setAdministrator(administrator);
   clock.setNow(about.now);
+  adopt(viewState.read(location.hash));
   await load();
 }
 
@@ -319,6 +386,5 @@ endedLinks.start((deleted) => {
   load();
 });
 notice.start(() => byId("links-heading").focus());
-fillFilters();
 listen();
 begin();

@@ -5,6 +5,8 @@ export const PAGE_SIZES = [25, 50, 100, 500];
 export const STATES = ["live", "not_yet", "disabled", "expired", "used_up"];
 export const SORTS = ["id", "project_name", "hash", "owner_uid", "use_count", "expire_at"];
 
+const LONGEST_FILTER = 64; // bytes; what the API takes at most
+
 const DEFAULTS = {
   search: "",
   state: "",
@@ -15,9 +17,22 @@ const DEFAULTS = {
   page: 1,
   size: 50,
 };
-export const FILTERS = ["search", "state", "project", "owner"];
+// The filters, and what the API calls them.
+export const ARGUMENTS = {
+  search: "search",
+  state: "state",
+  project: "project_name",
+  owner: "owner_user",
+};
+export const FILTERS = Object.keys(ARGUMENTS);
 
 export const isFiltered = (view) => FILTERS.some((name) => view[name] !== "");
+
+// As much of a text as the API takes, in whole characters.
+function cut(text) {
+  const {read: units} = new TextEncoder().encodeInto(text, new Uint8Array(LONGEST_FILTER));
+  return text.slice(0, units);
+}
 
 // Anybody can write a fragment into a link to this page: what is not a choice of the page's is left
 // at its default.
@@ -27,10 +42,10 @@ export function read(fragment) {
       choices.includes(given.get(name)) ? given.get(name) : fallback;
   const page = /^[1-9][0-9]{0,5}$/.test(given.get("page") ?? "") ? Number(given.get("page")) : 1;
   return {
-    search: given.get("search") ?? DEFAULTS.search,
+    search: cut(given.get("search") ?? DEFAULTS.search),
     state: oneOf("state", STATES, DEFAULTS.state),
-    project: given.get("project") ?? DEFAULTS.project,
-    owner: given.get("owner") ?? DEFAULTS.owner,
+    project: cut(given.get("project") ?? DEFAULTS.project),
+    owner: cut(given.get("owner") ?? DEFAULTS.owner),
     sort: oneOf("sort", SORTS, DEFAULTS.sort),
     descending: oneOf("order", ["up", "down"], "down") === "down",
     page,
@@ -60,15 +75,9 @@ export function query(view) {
     sort: view.sort,
     descending: view.descending,
   };
-  const filters = {
-    search: view.search,
-    state: view.state,
-    project_name: view.project,
-    owner_user: view.owner,
-  };
-  for (const [name, value] of Object.entries(filters)) {
-    if (value !== "") {
-      settings[name] = value;
+  for (const [name, argument] of Object.entries(ARGUMENTS)) {
+    if (view[name] !== "") {
+      settings[argument] = view[name];
     }
   }
   return settings;

@@ -1,5 +1,7 @@
 #include "webapi/answer.h"
 
+#include <utility>
+
 namespace webapi {
 
 namespace {
@@ -39,10 +41,10 @@ int StatusOf(Error error) {
 
 }  // namespace
 
-Json::Value SuccessAnswer(const Json::Value& data) {
+Json::Value SuccessAnswer(Json::Value data) {
   Json::Value answer(Json::objectValue);
   answer["success"] = true;
-  answer["data"] = data;
+  answer["data"] = std::move(data);
   return answer;
 }
 

@@ -9,7 +9,7 @@
 namespace webapi {
 
 // {"success": true, "data": …}
-Json::Value SuccessAnswer(const Json::Value& data);
+Json::Value SuccessAnswer(Json::Value data);
 
 // {"success": false, "error": {"code": …, "message": …, "field": …}}; without a field when it is
 // none that is at fault.

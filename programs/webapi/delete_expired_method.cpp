@@ -7,6 +7,8 @@
 namespace webapi {
 
 owner::MaybeProblem DeleteExpiredMethod(Turn* turn) {
+  const bool only_count = turn->arguments.get("dry_run", false).asBool();
+  turn->is_event = !only_count;
   if (owner::MaybeProblem problem = CheckOwner(turn->account, turn->arguments)) {
     return problem;
   }
@@ -22,8 +24,7 @@ owner::MaybeProblem DeleteExpiredMethod(Turn* turn) {
   if (owner::MaybeProblem problem = OpenDatabase(&db)) {
     return problem;
   }
-  const auto act = turn->arguments.get("dry_run", false).asBool() ? owner::CountExpiredLinks
-                                                                  : owner::DeleteExpiredLinks;
+  const auto act = only_count ? owner::CountExpiredLinks : owner::DeleteExpiredLinks;
   int deleted = 0;
   if (owner::MaybeProblem problem = act(*db, scope, settings.project_name.value_or(""), &deleted)) {
     return problem;

@@ -3,6 +3,7 @@
 #include <syslog.h>
 
 #include <exception>
+#include <utility>
 
 #include "common/event_log.h"
 #include "owner/argument.h"
@@ -46,6 +47,7 @@ struct Outcome {
   MaybeProblem problem;
   Json::Value data = Json::Value(Json::objectValue);
   int link = 0;
+  bool is_event = true;
 };
 
 MaybeProblem Run(const Call& call, Outcome* outcome) {
@@ -59,7 +61,8 @@ MaybeProblem Run(const Call& call, Outcome* outcome) {
   if (MaybeProblem problem = ReadArguments(call, *outcome->method, &arguments)) {
     return problem;
   }
-  Turn turn{*call.account, arguments, call.place, std::time(nullptr), outcome->data, outcome->link};
+  Turn turn{*call.account, arguments,     call.place,       std::time(nullptr),
+            outcome->data, outcome->link, outcome->is_event};
   return outcome->method->run(&turn);
 }
 
@@ -85,10 +88,10 @@ Json::Value Handle(const Call& call) {
     syslog(LOG_ERR, "handler:%d request failed: %s", __LINE__, error.what());
     outcome.problem = owner::InternalFault();
   }
-  if (outcome.method != nullptr && outcome.method->changes) {
+  if (outcome.method != nullptr && outcome.method->changes && outcome.is_event) {
     LogChange(call, outcome);
   }
-  return outcome.problem ? FailureAnswer(*outcome.problem) : SuccessAnswer(outcome.data);
+  return outcome.problem ? FailureAnswer(*outcome.problem) : SuccessAnswer(std::move(outcome.data));
 }
 
 }  // namespace webapi

@@ -11,8 +11,8 @@ namespace webapi {
 // The answer to `call`. Checks, in this order: API, version, method; that a change came in a way in
 // which changes may come, and not from another site; the account; the arguments. Only then the
 // database is looked at. A call of a method that changes something leaves one line in the event
-// log, whatever became of it. What a method throws is Error::kInternal, and logged; lack of memory
-// while the answer is made up is thrown on.
+// log, whatever became of it, unless it was only to count. What a method throws is
+// Error::kInternal, and logged; lack of memory while the answer is made up is thrown on.
 Json::Value Handle(const Call& call);
 
 }  // namespace webapi

@@ -1,8 +1,5 @@
 #include "webapi/http_request.h"
 
-#include <arpa/inet.h>
-#include <tuvoplatform/cgi.h>
-
 #include <algorithm>
 #include <charconv>
 #include <cstdint>
@@ -10,6 +7,7 @@
 #include <optional>
 #include <string>
 
+#include "common/client_address.h"
 #include "owner/argument.h"
 #include "webapi/same_origin.h"
 #include "webapi/text_arguments.h"
@@ -111,18 +109,13 @@ MaybeProblem ReadRequest(common::Exchange& exchange, Json::Value* request, Call*
   return Fault(Error::kNeedsPost, "only GET, HEAD and POST are understood");
 }
 
-std::string ClientAddress() {
-  std::array<char, INET6_ADDRSTRLEN> address{};
-  return TuvoCgiGetRemoteIP(address.data(), address.size()) == 0 ? address.data() : "";
-}
-
 void ReadCircumstances(Call* call) {
   call->place.https = IsHttps();
   const std::int64_t port = Number(Text("SERVER_PORT")).value_or(0);
   call->place.port = port <= UINT16_MAX ? static_cast<int>(port) : 0;
   call->same_origin = IsSameOrigin({Variable("HTTP_SEC_FETCH_SITE"), Variable("HTTP_ORIGIN"),
                                     Text("HTTP_HOST"), call->place.https});
-  call->address = ClientAddress();
+  call->address = common::ClientAddress();
   const std::string user = Text("REMOTE_USER");
   if (!user.empty()) {
     call->account = owner::AccountOfName(user);

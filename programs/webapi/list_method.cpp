@@ -100,18 +100,17 @@ MaybeProblem ListMethod(Turn* turn) {
   if (MaybeProblem problem = OpenDatabase(&db)) {
     return problem;
   }
-  std::vector<TUVO::sharing::record::Entry> links;
+  Json::Value& links = turn->data["links"] = Json::Value(Json::arrayValue);
+  const auto take = [&links, now = turn->now](const TUVO::sharing::record::Entry& link) {
+    links.append(owner::LinkJson(link, now));
+  };
   int total = 0;
-  if (MaybeProblem problem = owner::ListLinks(*db, request, turn->now, &links, &total)) {
+  if (MaybeProblem problem = owner::ForEachLink(*db, request, turn->now, take, &total)) {
     return problem;
   }
   turn->data["total"] = total;
   turn->data["offset"] = request.offset;
   turn->data["now"] = owner::MomentText(turn->now);
-  turn->data["links"] = Json::Value(Json::arrayValue);
-  for (const TUVO::sharing::record::Entry& link : links) {
-    turn->data["links"].append(owner::LinkJson(link, turn->now));
-  }
   return std::nullopt;
 }
 

@@ -23,6 +23,7 @@ struct Turn {
   std::time_t now;
   Json::Value& data;  // the method's answer; an empty object at first
   int& link;          // the row of the link that the method found or made, for the event log
+  bool& is_event;  // whether a method that changes something leaves its line there; true at first
 };
 
 struct Method {

@@ -27,6 +27,21 @@ MaybeProblem ReadChange(const Turn& turn, owner::LinkName* name, owner::Settings
   return owner::ReadSettings(turn.arguments, turn.now, settings);
 }
 
+// Looks at the file that the link will lead to, while nobody has to wait for it.
+MaybeProblem LookBefore(const owner::LinkName& name, const owner::Settings& settings,
+                        TUVO::sharing::db::BaseDB& db, Turn* turn, owner::FileLook* look) {
+  Entry link;
+  if (MaybeProblem problem = owner::FindLink(db, name, ScopeOf(turn->account), &link)) {
+    return problem;
+  }
+  turn->link = link.get_id();
+  if (MaybeProblem problem = owner::ApplySettings(settings, &link)) {
+    return problem;
+  }
+  return owner::LookAtFile(common::ReadConfig().share_folders, link, turn->account.administrator,
+                           look);
+}
+
 }  // namespace
 
 MaybeProblem SetMethod(Turn* turn) {
@@ -39,15 +54,18 @@ MaybeProblem SetMethod(Turn* turn) {
   if (MaybeProblem problem = OpenDatabase(&db)) {
     return problem;
   }
+  owner::FileLook look;
+  const bool touches_file = owner::TouchesFile(settings);
+  if (touches_file) {
+    if (MaybeProblem problem = LookBefore(name, settings, *db, turn, &look)) {
+      return problem;
+    }
+  }
   Entry link;
   const auto change = [&](Entry* found) {
     turn->link = found->get_id();
     MaybeProblem problem = owner::ApplySettings(settings, found);
-    if (!problem && owner::TouchesFile(settings)) {
-      problem = owner::CheckFileLink(common::ReadConfig().share_folders, found,
-                                     turn->account.administrator);
-    }
-    return problem;
+    return problem || !touches_file ? problem : owner::UseLook(look, found);
   };
   if (MaybeProblem problem = owner::ChangeLink(*db, name, ScopeOf(turn->account), change, &link)) {
     return problem;

@@ -15,6 +15,7 @@
 #include "common/stream.h"
 #include "owner/argument.h"
 #include "webapi/answer.h"
+#include "webapi/caller_limits.h"
 #include "webapi/handler.h"
 #include "webapi/text_arguments.h"
 
@@ -22,6 +23,7 @@ namespace {
 
 using owner::MaybeProblem;
 
+constexpr const char* kName = "tuvowebapi";
 constexpr const char* kExec = "--exec";
 constexpr const char* kHelp = "--help";
 constexpr const char* kLocal = "local";
@@ -48,12 +50,12 @@ MaybeProblem ReadCommandLine(const std::vector<std::string>& arguments, webapi::
   return webapi::ReadCall(request, true, call);
 }
 
-Json::Value AnswerTo(const std::vector<std::string>& arguments) {
+Json::Value AnswerTo(const std::vector<std::string>& arguments, uid_t caller) {
   webapi::Call call;
   if (const MaybeProblem problem = ReadCommandLine(arguments, &call)) {
     return webapi::FailureAnswer(*problem);
   }
-  call.account = owner::AccountOfUid(getuid());
+  call.account = owner::AccountOfUid(caller);
   call.address = kLocal;
   return webapi::Handle(call);
 }
@@ -68,28 +70,40 @@ bool Apologize() {
 
 // Started set-user-id root, nothing of the caller's environment may reach the libraries: neither
 // the time zone, in which times are read and written, nor folders and locales.
-int Run(const std::vector<std::string>& arguments) {
+int Run(const std::vector<std::string>& arguments, uid_t caller) {
   common::RequestEnvironment environment({});
   environment.Become(nullptr);
-  const Json::Value answer = AnswerTo(arguments);
+  const Json::Value answer = AnswerTo(arguments, caller);
   const bool printed = Print(owner::WriteJson(answer) + "\n");
   return printed && webapi::IsSuccess(answer) ? EXIT_SUCCESS : EXIT_FAILURE;
+}
+
+// The identity first: from then on the caller can neither stop the program nor look into it. The
+// log is opened before anything is done that has to stand there.
+bool Prepare() {
+  if (!common::DropPrivileges() || !common::HideFromCaller() || !webapi::TakeDescriptors()) {
+    return false;
+  }
+  openlog(kName, LOG_PID | LOG_NDELAY, LOG_USER);
+  return true;
 }
 
 }  // namespace
 
 int main(int argc, char* argv[]) {
   // By its name and not by what the caller says that it is.
-  openlog("tuvowebapi", LOG_PID, LOG_USER);
-  const bool dropped = common::DropPrivileges();
+  openlog(kName, LOG_PID, LOG_USER);
+  const uid_t caller = getuid();
+  webapi::IgnoreTerminalStops();
   (void)std::signal(SIGPIPE, SIG_IGN);
+  const bool prepared = Prepare();
   try {
     const std::vector<std::string> arguments(argv + (argc > 0 ? 1 : 0), argv + argc);
     if (arguments.size() == 1 && arguments.front() == kHelp) {
       return Print(kUsage) ? EXIT_SUCCESS : EXIT_FAILURE;
     }
-    if (dropped) {
-      return Run(arguments);
+    if (prepared) {
+      return Run(arguments, caller);
     }
   } catch (const std::exception& error) {
     syslog(LOG_ERR, "tool_main:%d %s", __LINE__, error.what());

@@ -2,12 +2,15 @@
 driver. With TUVO_SCREENSHOTS set to a folder, pictures of pages are left there. To be imported in a
 test program, which it ends as skipped where there is no browser."""
 
+import atexit
 import json
 import os
 import shutil
 import socket
 import tempfile
+import sys
 import time
+import unittest
 import urllib.parse
 
 import visitor_server as vs
@@ -39,10 +42,13 @@ FLAGS = ("--headless", "--no-sandbox", "--disable-gpu", "--disable-quic", "--no-
 PATIENCE = 20  # seconds
 
 
-class Browser:
-    """A browser with a fresh profile, from start() to quit()."""
+class _Running:
+    """A browser's process. Starting one takes longer than most tests, so that it is used again,
+    cleaned, by whoever needs one next."""
 
-    def start(self):
+    idle = []
+
+    def __init__(self):
         self.profile = tempfile.mkdtemp()
         self.downloads = os.path.join(self.profile, "downloads")
         os.mkdir(self.downloads)
@@ -60,11 +66,44 @@ class Browser:
             raise
         self.browser.set_page_load_timeout(60)
         self.browser.set_script_timeout(120)
+        atexit.register(self.end)
+
+    def clean(self):
+        """What a page left behind: in a new tab there is no emulation, no script and no page of the
+        old one; cookies, storage and cache are of the whole profile. The account that was signed in
+        last is remembered; tests sign in by themselves."""
+        old = self.browser.current_window_handle
+        self.browser.switch_to.new_window("tab")
+        new = self.browser.current_window_handle
+        self.browser.switch_to.window(old)
+        self.browser.close()
+        self.browser.switch_to.window(new)
+        self.browser.execute_cdp_cmd("Network.clearBrowserCookies", {})
+        self.browser.execute_cdp_cmd("Network.clearBrowserCache", {})
+        self.browser.execute_cdp_cmd("Storage.clearDataForOrigin",
+                                     {"origin": "*", "storageTypes": "all"})
+        for log in "browser", "performance":
+            self.browser.get_log(log)
+        for name in os.listdir(self.downloads):
+            os.unlink(os.path.join(self.downloads, name))
+
+    def end(self):
+        self.browser.quit()
+        shutil.rmtree(self.profile, ignore_errors=True)
+
+
+class Browser:
+    """A browser that has been nowhere yet, from start() to quit()."""
+
+    def start(self):
+        self.running = _Running.idle.pop() if _Running.idle else _Running()
+        self.browser = self.running.browser
+        self.downloads = self.running.downloads
         return self
 
     def quit(self):
-        self.browser.quit()
-        shutil.rmtree(self.profile, ignore_errors=True)
+        self.running.clean()
+        _Running.idle.append(self.running)
 
     def __enter__(self):
         return self.start()
@@ -115,8 +154,15 @@ class Browser:
                         else element.find_element(By.TAG_NAME, "input"))
         raise AssertionError(f"no field is labelled: {label}")
 
-    def has_focus(self, element):
-        return self.browser.switch_to.active_element == element
+    def assert_focus(self, look):
+        """On what `look` finds; pages give it away a moment after what they do."""
+        self.wait_for(lambda: (self.browser.switch_to.active_element, look()),
+                      lambda seen: seen[0] == seen[1])
+
+    def assert_text(self, identifier, text):
+        """The element of this id says so, perhaps after a moment."""
+        self.wait_for(lambda: self.browser.find_element(By.ID, identifier).text,
+                      lambda seen: text in seen)
 
     def style(self, selector, name):
         return self.browser.execute_script(
@@ -178,3 +224,42 @@ class Browser:
         """Of the page itself; narrower than the windows that the browser opens."""
         self.browser.execute_cdp_cmd("Emulation.setDeviceMetricsOverride", {
             "width": width, "height": height, "deviceScaleFactor": 1, "mobile": False})
+
+
+class _Result(unittest.TextTestResult):
+    """Keeps a picture of the page for every test that fails, as it is in that moment."""
+
+    folder = ""
+
+    def keep(self, test):
+        test = getattr(test, "test_case", test)  # of a part of a test
+        if not hasattr(test, "browser"):
+            return
+        try:
+            os.makedirs(self.folder, exist_ok=True)
+            test.browser.save_screenshot(os.path.join(self.folder, test.id() + ".png"))
+        except WebDriverException as error:
+            print("no picture:", error, file=sys.stderr)
+
+    def addError(self, test, err):
+        super().addError(test, err)
+        self.keep(test)
+
+    def addFailure(self, test, err):
+        super().addFailure(test, err)
+        self.keep(test)
+
+    def addSubTest(self, test, subtest, err):
+        super().addSubTest(test, subtest, err)
+        if err is not None:
+            self.keep(test)
+
+
+def run_tests():
+    """Runs the tests of the program, which was started with the build folder and the project's
+    folder and perhaps names of tests; the status to end with."""
+    _Result.folder = (os.environ.get("TUVO_SCREENSHOTS") or
+                      os.path.join(sys.argv[1], "Testing", "pictures"))
+    runner = unittest.TextTestRunner(verbosity=2, resultclass=_Result)
+    program = unittest.main(argv=sys.argv[:1] + sys.argv[3:], testRunner=runner, exit=False)
+    return 0 if program.result.wasSuccessful() else 1

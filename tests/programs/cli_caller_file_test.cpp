@@ -2,13 +2,18 @@
 
 #include <gtest/gtest.h>
 #include <sys/stat.h>
+#include <sys/wait.h>
+#include <tuvosharing/keys.h>
+#include <tuvosharing/sharing_db.h>
 #include <unistd.h>
 
+#include <csignal>
 #include <filesystem>
 #include <fstream>
 #include <string>
 
 #include "cli/failure.h"
+#include "cli/interrupt.h"
 #include "common/privileges.h"
 #include "common/stream.h"
 #include "support/child.h"
@@ -93,6 +98,39 @@ TEST_F(CliCallerFile, NothingButFilesIsReplaced) {
   EXPECT_THROW(NewFile(path_, true), Failure);
   EXPECT_THROW(NewFile(path_, false), Failure);
   EXPECT_FALSE(fs::exists("/tmp/callers/elsewhere"));
+}
+
+TEST_F(CliCallerFile, DatabaseInUseIsNotReplaced) {
+  ASSERT_TRUE(TUVO::sharing::db::SharingDB::Instance().IsGood());
+  const std::string database = TUVO::sharing::SZF_SHARING_DB_PATH;
+  for (const bool replace : {false, true}) {
+    for (const char* name : {"", "-wal", ".copy"}) {
+      try {
+        const NewFile file(database + name, replace);
+        FAIL() << name;
+      } catch (const Failure& failure) {
+        EXPECT_EQ(failure.status(), ExitStatus::kUsage);
+      }
+    }
+  }
+}
+
+TEST_F(CliCallerFile, SignalEndsTheWaitingForAPipesOtherEnd) {
+  ASSERT_EQ(mkfifo(path_.c_str(), 0600), 0);
+  const int status = tuvo_test::RunInChild([this] {
+    NoteSignals();
+    const pid_t parent = getpid();
+    const pid_t child = fork();
+    if (child == 0) {
+      usleep(200000);
+      (void)kill(parent, SIGTERM);
+      _exit(0);
+    }
+    EXPECT_THROW(OpenCallersFile(path_), Interruption);
+    EXPECT_EQ(waitpid(child, nullptr, 0), child);
+    return 0;
+  });
+  EXPECT_EQ(status, 0);
 }
 
 TEST_F(CliCallerFile, FileIsReadUpToTheMost) {

@@ -75,6 +75,23 @@ TEST(CliCommandLine, PasswordIsNoValue) {
   EXPECT_NE(Complaint({"create", "--project", "x", "--password", "secret"}), "");
 }
 
+TEST(CliCommandLine, FlagsTakeNoValue) {
+  for (const char* word : {"--enabled=false", "--match-ip=false", "--auto-gc=true", "--json=0"}) {
+    EXPECT_NE(Complaint({"create", "--project", "x", word}).find("takes no value"),
+              std::string::npos)
+        << word;
+  }
+  EXPECT_NE(Complaint({"delete", "a", "--yes=no"}), "");
+  EXPECT_NE(Complaint({"delete", "a", "-y=no"}), "");
+}
+
+TEST(CliCommandLine, EmptyValueIsNotTheNextWord) {
+  EXPECT_EQ(Complaint({"edit", "a", "--title=", "--disabled"}), "");
+  EXPECT_EQ(Complaint({"edit", "a", "--users=", "--groups="}), "");
+  EXPECT_NE(Complaint({"list", "--limit=", "5"}), "");
+  EXPECT_NE(Complaint({"purge", "--owner=", "alice"}), "");
+}
+
 TEST(CliCommandLine, ContradictionsAreRefused) {
   EXPECT_NE(Complaint({"create", "--enabled", "--disabled"}), "");
   EXPECT_NE(Complaint({"create", "--auto-gc", "--no-auto-gc"}), "");

@@ -36,6 +36,8 @@ TEST_F(CliDisplay, CharactersThatSteerOthersAreWrittenOut) {
   EXPECT_EQ(Harmless("\u202e\u2066\u200f\u061c"), "\\u202e\\u2066\\u200f\\u061c");
   EXPECT_EQ(Harmless("\u2028\u2029\ufeff\u200b\u00ad"), "\\u2028\\u2029\\ufeff\\u200b\\xad");
   EXPECT_EQ(Harmless("\U000e0041"), "\\ue0041");
+  EXPECT_EQ(Harmless("\u0600\u06dd\u08e2\U000110bd\U0001d173"),
+            "\\u0600\\u06dd\\u08e2\\u110bd\\u1d173");
 }
 
 TEST_F(CliDisplay, BytesThatAreNoTextAreReplaced) {

@@ -40,6 +40,24 @@ TEST(CliLinkName, NamesComeInTheirOrderWithTheNumbersBehind) {
   EXPECT_EQ(TextOf(names[3]), "#3");
 }
 
+TEST(CliLinkName, LinkThatIsNamedTwiceStandsThereOnce) {
+  const std::vector<owner::LinkName> names = LinkNamesOf({"b", "#7", "b"}, {"7", "3"});
+  ASSERT_EQ(names.size(), 3U);
+  EXPECT_EQ(TextOf(names[0]), "b");
+  EXPECT_EQ(TextOf(names[1]), "#7");
+  EXPECT_EQ(TextOf(names[2]), "#3");
+}
+
+TEST(CliLinkName, RowsAreNamedByAnyNumber) {
+  EXPECT_EQ(RowIdsOf({"#3000000000", "#-5", "#7"}, {"0", "7"}),
+            (std::vector<RowId>{-5, 0, 7, 3000000000}));
+  for (const char* text : {"", "abc", "7", "#", "#x", "#9223372036854775808"}) {
+    EXPECT_THROW(RowIdsOf({text}, {}), Failure) << text;
+  }
+  EXPECT_THROW(RowIdsOf({}, {}), Failure);
+  EXPECT_THROW(RowIdsOf({}, {""}), Failure);
+}
+
 TEST(CliLinkName, NoneAtAllIsAFailure) {
   EXPECT_THROW(LinkNamesOf({}, {}), Failure);
   EXPECT_THROW(LinkNamesOf({"a"}, {"x"}), Failure);

@@ -181,9 +181,22 @@ class Usage(CliTest):
                           ["unblock", "localhost"], ["backup"], ["import", "--on-conflict", "x"],
                           ["create", "--project", "x", "--enabled", "--disabled"],
                           ["create", "--project", "x", "--password", "--password-stdin"],
-                          ["create", "--project", "x", "--project", "y"]):
+                          ["create", "--project", "x", "--project", "y"],
+                          ["create", "--project", "x", "--enabled=false"],
+                          ["create", "--project", "file", "--path", ""], ["backup", "-"],
+                          ["list", "--json=no"], ["show", "abc", "--id="]):
             with self.subTest(arguments=arguments):
                 self.assert_fails(run(*arguments), USAGE)
+
+    def test_a_value_behind_a_sign_ends_with_its_word(self):
+        links = [create("--title=a=b", "--app={}"), create()]
+        self.assertEqual(show(links[0])["protect_title"], "a=b")
+        self.assertEqual(run("edit", links[0], "--title=", "--disabled").returncode, DONE)
+        shown = show(links[0])
+        self.assertEqual((shown["protect_title"], shown["enabled"]), ("", False))
+        self.assertEqual(run("edit", "--start=", links[1], "--title=t").returncode, DONE)
+        self.assertEqual(show(links[1])["protect_title"], "t")
+        self.assertEqual(show(links[0])["protect_title"], "")
 
     def test_an_empty_filter_is_a_slip_and_not_everybody(self):
         create("--expire", "+1s")
@@ -352,6 +365,15 @@ class FileLinks(CliTest):
         self.assert_fails(done, NOT_ALLOWED, link, "--path")
         self.assertEqual(show(link)["app"]["path"], "/srv/shares/alice/hers")
 
+    def test_data_that_grows_by_its_path_stays_below_the_most(self):
+        link = create("--project", "file", "--owner", "alice", "--path", "/srv/shares/alice/hers")
+        data = data_of(link)
+        data["app"] = {"note": "n" * 65500, "path": "/"}
+        sql("UPDATE entry SET data=? WHERE hash=?", json.dumps(data), link)
+        done = run("edit", link, "--path", "/srv/shares/alice/hers")
+        self.assert_fails(done, USAGE, "64 KiB")
+        self.assertEqual(data_of(link), data)
+
     def test_another_owner_must_be_able_to_read_the_file(self):
         link = create("--project", "file", "--owner", "alice", "--path", "/srv/shares/alice/hers")
         self.assert_fails(run("edit", link, "--owner", "bob"), NOT_ALLOWED)
@@ -393,6 +415,11 @@ class Terminals(CliTest):
 
     def test_without_a_terminal_there_is_nobody_to_ask(self):
         self.assert_fails(run("create", "--project", "x", "--password"), USAGE, "--password-stdin")
+
+    def test_a_password_is_not_read_from_a_terminal_that_shows_it(self):
+        terminal = Terminal("create", "--project", "album", "--password-stdin")
+        terminal.expect(b"--password-stdin: ")
+        self.assertEqual(terminal.end(), USAGE)
 
     def test_deletion_asks_first(self):
         link = create()
@@ -455,6 +482,13 @@ class Terminals(CliTest):
         terminal = Terminal("export", "-")
         terminal.expect(b'"format"')
         self.assertEqual(terminal.end(), DONE)
+
+
+def numbers_begin_anew():
+    """Behind rows of large numbers new ones would have larger ones still."""
+    for table in "entry", "session", "token":
+        sql("DELETE FROM " + table)
+    sql("DELETE FROM sqlite_sequence")
 
 
 def many_links(count):
@@ -564,6 +598,8 @@ class Edit(CliTest):
                                    stderr=subprocess.PIPE)
         time.sleep(0.5)
         self.assertIsNone(process.poll())
+        time.sleep(5)
+        self.assertIsNone(process.poll())
         holder.execute("ROLLBACK")
         holder.close()
         self.assertEqual((process.wait(), process.stderr.read()), (DONE, b""))
@@ -599,6 +635,31 @@ class Delete(CliTest):
         self.assert_fails(run("delete", "--yes", "--damaged", f"#{good}"), USAGE, "not damaged")
         self.assertEqual(run("delete", "--yes", "--damaged", "#9101").returncode, DONE)
         self.assertEqual(sql("SELECT hash FROM entry"), [(link,)])
+
+    def test_a_link_that_is_named_twice_is_deleted_once(self):
+        link = create()
+        done = run("delete", "--yes", link, link, f"#{show(link)['id']}")
+        self.assertEqual((done.returncode, done.stderr), (DONE, ""))
+
+    def test_rows_of_numbers_that_no_link_has(self):
+        self.addCleanup(numbers_begin_anew)
+        insert = "INSERT INTO entry VALUES (?, ?, 'x', 1, 5, 0, 0, 0, 0, 1, ?)"
+        plain = json.dumps({"app": {}, "protect_type": "none"})
+        for number in -5, 3000000000, 9223372036854775807:
+            sql(insert, number, f"h{number}", plain)
+        done = run("check", "--json")
+        self.assertEqual([(item["subject"], item["reason"])
+                          for item in json.loads(done.stdout)["findings"]],
+                         [("entry #-5", "id"), ("entry #3000000000", "id"),
+                          ("entry #9223372036854775807", "id")])
+        done = run("export")
+        self.assertEqual(done.returncode, DONE)
+        self.assertEqual([json.loads(line).get("hash") for line in done.stdout.splitlines()[1:-1]],
+                         ["h-5", "h3000000000", "h9223372036854775807"])
+        done = run("delete", "--yes", "--damaged", "#3000000000", "#-5", "#9223372036854775807",
+                   "#-5")
+        self.assertEqual((done.returncode, done.stderr), (DONE, ""))
+        self.assertEqual(sql("SELECT * FROM entry"), [])
 
     def test_nothing_is_deleted_when_one_is_missing(self):
         link = create()
@@ -699,6 +760,25 @@ class Visitors(CliTest):
             self.assertEqual(json.loads(run(command, "--json").stdout)["total"], 0)
         self.assert_fails(run("sessions", "gone"), NO_SUCH_LINK)
 
+    def test_admission_ends_with_the_session(self):
+        link = create()
+        vs.run_program("POST", "/" + link, uid=SYSTEM)
+        self.assertEqual(json.loads(run("tokens", "--json").stdout)["total"], 1)
+        sql("UPDATE session SET timeout = 1000")
+        self.assertEqual(json.loads(run("tokens", "--json").stdout)["total"], 0)
+
+    def test_sessions_of_any_number_are_listed(self):
+        self.addCleanup(numbers_begin_anew)
+        create()
+        for number in -5, 7, 3000000000:
+            sql("INSERT INTO session VALUES (?, ?, 5, '192.0.2.1', 4000000000)", number,
+                f"s{number}")
+        sessions = json.loads(run("sessions", "--json").stdout)["sessions"]
+        self.assertEqual([session["id"] for session in sessions], [-5, 7, 3000000000])
+        findings = json.loads(run("check", "--json").stdout)["findings"]
+        subjects = [item["subject"] for item in findings]
+        self.assertEqual(subjects, ["session #-5", "session #3000000000"])
+
 
 class Purge(CliTest):
     def make_ended(self):
@@ -744,6 +824,32 @@ class Purge(CliTest):
         sql("UPDATE entry SET expire_at = 1000 WHERE project_name = 'many'")
         self.assertEqual(run("purge").stdout, "removed 1700 links\n")
         self.assertEqual(len(sql("SELECT * FROM entry")), 1)
+
+    def test_writers_come_in_between_the_pieces(self):
+        link = create()
+        many_links(30000)
+        sql("UPDATE entry SET expire_at = 1000 WHERE project_name = 'many'")
+        writer = sqlite3.connect(DATABASE, timeout=0, isolation_level=None)
+        seen = set()
+        process = subprocess.Popen([PROGRAM, "purge"], stdout=subprocess.PIPE)
+        while process.poll() is None:
+            try:
+                writer.execute("BEGIN IMMEDIATE")
+            except sqlite3.OperationalError:  # locked
+                time.sleep(0.001)
+                continue
+            writer.execute("UPDATE entry SET use_count = use_count + 1 WHERE hash = ?", (link,))
+            left = writer.execute("SELECT count(*) FROM entry").fetchone()[0] - 1
+            writer.execute("COMMIT")
+            seen.add(left)
+            time.sleep(0.001)
+        writer.close()
+        self.assertEqual((process.wait(), process.stdout.read()), (DONE, b"removed 30000 links\n"))
+        process.stdout.close()
+        # What a writer sees between is whole pieces that have gone, and others that have not.
+        between = [left for left in seen if 0 < left < 30000]
+        self.assertGreater(len(between), 0)
+        self.assertEqual([left for left in between if left % 500 != 0], [])
 
 
 class Transfer(CliTest):
@@ -843,11 +949,47 @@ class Transfer(CliTest):
         create()
         sql("INSERT INTO entry VALUES (NULL, 'bad', 'x', 1, 5, 0, 0, 0, 0, 1, 'no json')")
         sql("INSERT INTO entry VALUES (NULL, 'zero', CAST(x'610062' AS TEXT), 1, 5, 0, 0, 0, 0, "
-            "1, '{\"app\":{}}')")
+            "1, '{\"app\":{},\"protect_type\":\"none\"}')")
         done = run("export")
         self.assertEqual(done.returncode, DAMAGE)
         self.assertIn("2 damaged rows", done.stderr)
         self.assertEqual(json.loads(done.stdout.splitlines()[-1]), {"links": 1})
+        # What one command leaves out the others know.
+        rows = sql("SELECT id FROM entry WHERE hash IN ('bad', 'zero') ORDER BY id")
+        findings = json.loads(run("check", "--json").stdout)["findings"]
+        self.assertEqual([(item["subject"], item["reason"]) for item in findings],
+                         [(f"entry #{rows[0][0]}", "data"), (f"entry #{rows[1][0]}",
+                                                             "project_name")])
+        self.assertEqual(run("delete", "--yes", "--damaged", *(f"#{row[0]}" for row in rows))
+                         .returncode, DONE)
+        self.assertEqual(run("export").returncode, DONE)
+
+    def test_an_export_beside_writers_is_of_one_moment(self):
+        # One is the first row and one the last, with many pieces between.
+        create("--hash", "left")
+        many_links(5000)
+        create("--hash", "right")
+        writer = subprocess.Popen([sys.executable, "-c", f"""
+import sqlite3
+c = sqlite3.connect({DATABASE!r}, timeout=60, isolation_level=None)
+c.execute("PRAGMA synchronous = OFF")
+print("ready", flush=True)
+while True:
+    c.execute("UPDATE entry SET use_count = use_count + 1 WHERE hash IN ('left', 'right')")
+"""], stdout=subprocess.PIPE)
+        try:
+            writer.stdout.readline()
+            counts = []
+            for _ in range(3):
+                lines = [json.loads(line) for line in run("export").stdout.splitlines()]
+                self.assertEqual((lines[1]["hash"], lines[-2]["hash"]), ("left", "right"))
+                self.assertEqual(lines[1]["use_count"], lines[-2]["use_count"])
+                counts.append(lines[1]["use_count"])
+            self.assertLess(counts[0], counts[2])
+        finally:
+            writer.kill()
+            writer.wait()
+            writer.stdout.close()
 
     def test_conflicts(self):
         link = create("--title", "old")
@@ -1154,17 +1296,37 @@ while True:
         self.assertEqual(run("check").returncode, DONE)
 
     def test_an_interrupted_backup_leaves_nothing(self):
-        many_links(30000)
+        many_links(100)
+        sql("UPDATE entry SET data = data || CAST(zeroblob(500000) AS TEXT)")  # 50 MB
         before = sorted(os.listdir("/tmp"))
         terminal = Terminal("backup", self.FILE)
         terminal.expect(b"pages copied: ")
         os.kill(terminal.pid, signal.SIGINT)
-        status = terminal.end()
-        if status == DONE:
-            self.skipTest("the copy was quicker than the signal")
-        self.assertEqual(status, -signal.SIGINT)
+        self.assertEqual(terminal.end(), -signal.SIGINT)
         self.assertEqual(sorted(os.listdir("/tmp")), before)
         self.assertEqual([name for name in os.listdir(FOLDER) if "backup" in name], [])
+
+
+    def test_the_database_in_use_is_not_replaced(self):
+        link = create()
+        holder = sqlite3.connect(DATABASE, isolation_level=None)
+        os.symlink(FOLDER, "/tmp/way")
+        try:
+            holder.execute("SELECT * FROM entry").fetchall()
+            before = [(name, os.stat(os.path.join(FOLDER, name)).st_ino)
+                      for name in sorted(os.listdir(FOLDER))]
+            for command in "backup", "export":
+                for path in (DATABASE, DATABASE + "-wal", FOLDER + "/autoblock.db",
+                             FOLDER + "/new", "/tmp/way/sharing.db"):
+                    self.assert_fails(run(command, "--force", path), USAGE, "database in use")
+                    self.assert_fails(run(command, path), USAGE, "database in use")
+                self.assert_fails(run(command, "--force", "sharing.db", cwd=FOLDER), USAGE)
+            self.assertEqual([(name, os.stat(os.path.join(FOLDER, name)).st_ino)
+                              for name in sorted(os.listdir(FOLDER))], before)
+            self.assertEqual(show(link)["hash"], link)
+        finally:
+            holder.close()
+            os.unlink("/tmp/way")
 
 
 class Unblock(CliTest):
@@ -1182,6 +1344,16 @@ class Unblock(CliTest):
             done = run("unblock", address, "192.0.2.78")
             self.assertEqual((done.returncode, done.stderr), (DONE, ""))
             self.assertEqual(status(), 303)
+
+    def test_a_bad_address_behind_a_good_one_changes_nothing(self):
+        link = create("--password-stdin", text="right")
+        for _ in range(10):
+            vs.run_program("POST", "/" + link, b"password=wrong", uid=SYSTEM,
+                           REMOTE_ADDR="192.0.2.99")
+        self.assert_fails(run("unblock", "192.0.2.99", "localhost"), USAGE, "localhost")
+        reply = vs.run_program("POST", "/" + link, b"password=right", uid=SYSTEM,
+                               REMOTE_ADDR="192.0.2.99")
+        self.assertEqual(reply.status, 429)
 
 
 class SystemLogLines(CliTest):
@@ -1221,10 +1393,67 @@ class SystemLogLines(CliTest):
             "sharing event=import link=0 address=local result=204 by=0",
             "sharing event=delete_expired link=0 address=local result=1 by=0",
             "sharing event=unblock link=0 address=local result=1 by=0"])
+        self.assertEqual(log.errors(), [])
         for line in log.lines:
             for secret in first, second, "secret":
                 self.assertNotIn(secret, line)
-        self.assertEqual(log.errors(), [])
+
+    def test_what_is_refused_leaves_its_code(self):
+        create()
+        with SystemLog() as log:
+            self.assert_fails(run("delete", "--yes", "gone"), NO_SUCH_LINK)
+            self.assert_fails(run("delete", "--yes", "--damaged", "#77777"), NO_SUCH_LINK)
+            self.assert_fails(run("unblock", "localhost"), USAGE)
+        self.assertEqual(self.events(log), [
+            "sharing event=delete link=0 address=local result=205 by=0",
+            "sharing event=delete link=77777 address=local result=205 by=0",
+            "sharing event=unblock link=0 address=local result=203 by=0"])
+
+    def test_a_purge_that_fails_leaves_its_line(self):
+        many_links(10)
+        sql("UPDATE entry SET expire_at = 1000")
+        holder = sqlite3.connect(DATABASE, isolation_level=None)
+        holder.execute("BEGIN IMMEDIATE")
+        try:
+            with SystemLog() as log:
+                self.assert_fails(run("purge"), BUSY)
+        finally:
+            holder.execute("ROLLBACK")
+            holder.close()
+        self.assertEqual(self.events(log),
+                         ["sharing event=delete_expired link=0 address=local result=207 by=0"])
+
+    def test_an_interrupted_purge_leaves_a_line_when_rows_went(self):
+        many_links(30000)
+        sql("UPDATE entry SET expire_at = 1000")
+        with SystemLog() as log:
+            terminal = Terminal("purge")
+            terminal.expect(b"removed: ")
+            os.kill(terminal.pid, signal.SIGTERM)
+            self.assertEqual(terminal.end(), -signal.SIGTERM)
+        left = len(sql("SELECT id FROM entry"))
+        self.assertTrue(0 < left < 30000, left)
+        self.assertEqual(self.events(log),
+                         ["sharing event=delete_expired link=0 address=local result=1 by=0"])
+
+    def test_a_signal_ends_a_command_that_waits_for_a_lock(self):
+        link = create()
+        holder = sqlite3.connect(DATABASE, isolation_level=None)
+        holder.execute("BEGIN IMMEDIATE")
+        try:
+            for arguments in ["purge"], ["edit", link, "--title", "x"]:
+                process = subprocess.Popen([PROGRAM, *arguments], stderr=subprocess.PIPE)
+                time.sleep(0.5)
+                self.assertIsNone(process.poll())
+                begun = time.monotonic()
+                process.terminate()
+                self.assertEqual(process.wait(timeout=30), -signal.SIGTERM)
+                # One wait of SQLite's, and not a second one.
+                self.assertLess(time.monotonic() - begun, 17)
+                process.stderr.close()
+        finally:
+            holder.execute("ROLLBACK")
+            holder.close()
 
 
 def main():

@@ -122,6 +122,13 @@ class Completion(unittest.TestCase):
                 done = subprocess.run([PROGRAM, *command, option, value], stdout=subprocess.PIPE)
                 self.assertEqual(done.returncode, 0, value)
 
+    def test_names_of_files_are_offered_as_they_are(self):
+        names = {"odd *", "odd a b", "odd $(id)", "odd ?dd", "odd [a]"}
+        os.makedirs("/tmp/odd")
+        for name in names:
+            open(os.path.join("/tmp/odd", name), "w").close()
+        self.assertEqual(completions("backup", "/tmp/odd/"), {"/tmp/odd/" + name for name in names})
+
     def test_links_are_not_offered(self):
         subprocess.run([PROGRAM, "create", "--project", "x", "--hash", "zzz-secret"], check=True,
                        stdout=subprocess.DEVNULL)

@@ -2,6 +2,7 @@
 Arguments: the build folder, the project's folder."""
 
 import os
+import signal
 import socket
 import sys
 import time
@@ -333,6 +334,30 @@ class Environment(GatewayTest):
             answer, ended = fastcgi.receive(connection)
         self.assertTrue(ended)
         self.assertEqual(read_reply(answer).status, 404)
+
+
+class DeadConnections(GatewayTest):
+    def test_download_that_nobody_waits_for_is_broken_off(self):
+        """Also when the whole answer fits into the program's buffer."""
+        small = "/tmp/shared/small"
+        with open(small, "wb") as file:
+            file.write(b"x" * 100)
+        for path in small, LARGE:
+            link = make_file_link(path)
+            cookie = post(self.program, link).session_id()
+            with vs.SystemLog() as log:
+                os.kill(self.program.pid, signal.SIGSTOP)
+                with self.program.begin(variables("GET", "/" + link, cookie=cookie)) as connection:
+                    fastcgi.send_body(connection, b"")
+                os.kill(self.program.pid, signal.SIGCONT)
+                for _ in range(100):
+                    if any("event=download" in line for line in log.lines):
+                        break
+                    time.sleep(0.05)
+            results = [line.rsplit("result=", 1)[1].rstrip("\0") for line in log.lines
+                       if "event=download" in line]
+            self.assertEqual(results, ["0"], path)
+        self.assert_alive()
 
 
 class Sockets(unittest.TestCase):

@@ -3,7 +3,12 @@
 #include <grp.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
+#include <sys/wait.h>
 #include <unistd.h>
+
+#include <array>
+#include <cerrno>
+#include <csignal>
 
 #include "support/child.h"
 
@@ -82,6 +87,51 @@ TEST(CommonPrivileges, CallersMaskIsReplaced) {
               return DropPrivileges() && umask(0) == 077 ? 0 : 1;
             }),
             0);
+}
+
+int HideFrom(const Ids& start, const Ids& end) {
+  return tuvo_test::RunInChildAs(start, [end] {
+    if (!HideFromCaller()) {
+      return 1;
+    }
+    return CurrentIds() == end ? 0 : 2;
+  });
+}
+
+TEST(CommonPrivileges, CallerIsLeftForTheSystemIdentityWithTheWayBackKept) {
+  EXPECT_EQ(HideFrom({2001, 2001, 0, 2001, 2001, 2001}, {1, 1, 0, 1, 1, 2001}), 0);
+}
+
+TEST(CommonPrivileges, WithoutSavedRootNothingIsHidden) {
+  EXPECT_EQ(HideFrom(tuvo_test::kNobody, tuvo_test::kNobody), 0);
+  EXPECT_EQ(HideFrom({0, 1, 0, 0, 1, 0}, {0, 1, 0, 0, 1, 0}), 0);
+}
+
+TEST(CommonPrivileges, CallerCannotSignalWhatHasHidden) {
+  std::array<int, 2> ready{};
+  ASSERT_EQ(pipe(ready.data()), 0);
+  const pid_t hidden = fork();
+  if (hidden == 0) {
+    if (setresgid(2001, 2001, 2001) != 0 || setresuid(2001, 2001, 0) != 0 || !HideFromCaller() ||
+        write(ready[1], "x", 1) != 1) {
+      _exit(1);
+    }
+    pause();
+    _exit(0);
+  }
+  char byte = 0;
+  ASSERT_EQ(read(ready[0], &byte, 1), 1);
+  for (const int signal : {SIGSTOP, SIGTERM, SIGKILL}) {
+    EXPECT_EQ(tuvo_test::RunInChildAs(
+                  {2001, 2001, 2001, 2001, 2001, 2001},
+                  [&] { return kill(hidden, signal) == -1 && errno == EPERM ? 0 : 1; }),
+              0)
+        << signal;
+  }
+  kill(hidden, SIGKILL);
+  waitpid(hidden, nullptr, 0);
+  close(ready[0]);
+  close(ready[1]);
 }
 
 }  // namespace

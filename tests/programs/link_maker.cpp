@@ -1,11 +1,12 @@
 // Creates a link as the tests of the programs want it: reads a JSON object with members of the
 // link's JSON form from standard input, and prints the link's hash. A member "password" is the
-// link's password in the clear.
+// link's password in the clear. Of a list of such objects all are created, in that order.
 #include <json/json.h>
 #include <tuvosharing/entry.h>
 #include <tuvosharing/entry_db.h>
 #include <tuvosharing/sharing_db.h>
 
+#include <algorithm>
 #include <iostream>
 #include <string>
 #include <vector>
@@ -61,16 +62,23 @@ Entry EntryOf(const Json::Value& wanted) {
   return entry;
 }
 
+bool Create(const Json::Value& wanted) {
+  Entry entry = EntryOf(wanted);
+  if (!EntryDB(SharingDB::Instance()).CreateWithHash(entry)) {
+    std::cerr << "the link could not be created\n";
+    return false;
+  }
+  std::cout << entry.get_hash() << '\n';
+  return true;
+}
+
 }  // namespace
 
 int main() {
   Json::Value wanted;
   std::cin >> wanted;
-  Entry entry = EntryOf(wanted);
-  if (!EntryDB(SharingDB::Instance()).CreateWithHash(entry)) {
-    std::cerr << "the link could not be created\n";
-    return 1;
+  if (wanted.isArray()) {
+    return std::all_of(wanted.begin(), wanted.end(), Create) ? 0 : 1;
   }
-  std::cout << entry.get_hash() << '\n';
-  return 0;
+  return Create(wanted) ? 0 : 1;
 }

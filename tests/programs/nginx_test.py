@@ -2,9 +2,12 @@
 own. Arguments: the build folder, the project's folder."""
 
 import base64
+import configparser
+import http.client
 import json
 import os
 import socket
+import ssl
 import subprocess
 import sys
 import time
@@ -46,6 +49,22 @@ http {
     include %(project)s/packaging/nginx/sharing.conf;
     include %(project)s/packaging/nginx/owner.conf;
   }
+  server {
+    listen 127.0.0.1:%(lenient)d;
+    root /var/empty;
+    satisfy any;
+    allow 127.0.0.1;
+    deny all;
+    include %(project)s/packaging/nginx/owner.conf;
+  }
+  server {
+    listen 127.0.0.1:%(secure)d ssl;
+    ssl_certificate /tmp/nginx/certificate;
+    ssl_certificate_key /tmp/nginx/key;
+    root /var/empty;
+    include %(project)s/packaging/nginx/sharing.conf;
+    include %(project)s/packaging/nginx/owner.conf;
+  }
 }
 """
 
@@ -59,9 +78,16 @@ class Nginx:
     def __enter__(self):
         os.mkdir("/tmp/nginx", 0o755)
         os.chown("/tmp/nginx", vs.WWW_DATA, vs.WWW_DATA)
-        self.port = vs.free_port()
+        ports = set()
+        while len(ports) < 3:
+            ports.add(vs.free_port())
+        self.port, self.lenient, self.secure = ports
+        subprocess.run(["openssl", "req", "-x509", "-newkey", "rsa:2048", "-nodes", "-days", "2",
+                        "-subj", "/CN=localhost", "-keyout", "/tmp/nginx/key",
+                        "-out", "/tmp/nginx/certificate"], check=True, stderr=subprocess.DEVNULL)
         with open("/tmp/nginx/nginx.conf", "w") as file:
             file.write(CONFIGURATION % {"module": MODULE, "port": self.port,
+                                        "lenient": self.lenient, "secure": self.secure,
                                         "project": self.project})
         self.process = subprocess.Popen(
             ["/usr/sbin/nginx", "-c", "/tmp/nginx/nginx.conf", "-e", "/tmp/nginx/error.log"],
@@ -87,6 +113,20 @@ def path_of(link):
 def login(name, password):
     token = base64.b64encode(f"{name}:{password}".encode()).decode()
     return {"Authorization": "Basic " + token}
+
+
+def ask(port, path, headers, method="GET", body=None, secure=False):
+    """The answer of another port than the usual one's."""
+    connection = http.client.HTTPConnection("127.0.0.1", port, timeout=60)
+    if secure:
+        connection = http.client.HTTPSConnection("127.0.0.1", port, timeout=60,
+                                                 context=ssl._create_unverified_context())
+    try:
+        connection.request(method, path, body, headers)
+        response = connection.getresponse()
+        return vs.Reply(response.status, response.getheaders(), response.read())
+    finally:
+        connection.close()
 
 
 class Visitors(unittest.TestCase):
@@ -159,10 +199,75 @@ class Owners(unittest.TestCase):
             self.assertEqual(reply.get("X-Content-Type-Options"), "nosniff")
             self.assertEqual(reply.get("Cache-Control"), "no-cache")
 
+            self.assertEqual(reply.get("Referrer-Policy"), "no-referrer")
+            self.assertEqual(reply.get("X-Frame-Options"), "DENY")
+            self.assertEqual(reply.get("Cross-Origin-Opener-Policy"), "same-origin")
+
+    def test_server_that_lets_addresses_in_without_a_password(self):
+        for path in "/owner/", QUERY:
+            for headers in {}, login("alice", "wrong"):
+                self.assertEqual(ask(SERVER.lenient, path, headers).status, 401)
+            self.assertEqual(ask(SERVER.lenient, path, login("alice", "alice-secret")).status, 200)
+
+    def test_large_request_stays_outside(self):
+        reply = Visitor(SERVER).request("POST", "/webapi/entry.cgi", "x" * 310 * 1024, {
+            "Content-Type": "application/json", **login("alice", "alice-secret")})
+        self.assertEqual(reply.status, 413)
+        self.assertNotIn(b'"success"', reply.body)
+
+    def test_port_and_scheme_reach_the_web_api(self):
+        body = json.dumps({"api": "TUVO.Sharing.Link", "version": 1, "method": "create",
+                           "project_name": "x"})
+        for secure, port, scheme in ((False, SERVER.port, "http"), (True, SERVER.secure, "https")):
+            headers = {"Content-Type": "application/json", "Origin": f"{scheme}://127.0.0.1:{port}",
+                       **login("alice", "alice-secret")}
+            reply = ask(port, "/webapi/entry.cgi", headers, "POST", body, secure)
+            data = json.loads(reply.body)["data"]
+            self.assertRegex(data["url"], rf"^{scheme}://[^/]*:{port}/sharing/")
+            other = dict(headers, Origin=f"http{'' if secure else 's'}://127.0.0.1:{port}")
+            self.assertEqual(ask(port, "/webapi/entry.cgi", other, "POST", body, secure).status, 403)
+
+    def test_cookie_is_secure_by_tls(self):
+        reply = ask(SERVER.secure, path_of(make_file_link(FILE)), {
+            "Content-Type": "application/x-www-form-urlencoded"}, "POST", "", True)
+        self.assertEqual(reply.status, 303)
+        self.assertIn("; Secure", reply.get("Set-Cookie"))
+
     def test_account_is_the_web_apis(self):
         reply = self.ask(QUERY, dict(login("alice", "alice-secret"), **{"Remote-User": "bob"}))
         self.assertEqual(reply.status, 200)
         self.assertEqual(json.loads(reply.body)["data"]["account"]["user"], "alice")
+
+
+class Units(unittest.TestCase):
+    """The units of packaging/systemd, as texts: nothing here runs under systemd."""
+
+    def read(self, name):
+        unit = configparser.ConfigParser(interpolation=None, strict=True)
+        unit.optionxform = str
+        with open(f"{sys.argv[2]}/packaging/systemd/tuvosharing-{name}") as file:
+            unit.read_file(file)
+        return unit
+
+    def test_sockets_are_the_web_servers_alone(self):
+        for name in "visitors", "webapi":
+            unit = self.read(f"{name}@.socket")["Socket"]
+            self.assertEqual((unit["SocketUser"], unit["SocketGroup"], unit["SocketMode"]),
+                             ("www-data", "www-data", "0600"))
+            self.assertEqual(unit["ListenStream"], f"/run/tuvosharing/{name}-%i.sock")
+            self.assertEqual(unit["TriggerLimitIntervalSec"], "0")
+
+    def test_identities(self):
+        visitors, webapi = (self.read(name + "@.service") for name in ("visitors", "webapi"))
+        self.assertEqual((visitors["Service"]["User"], visitors["Service"]["Group"],
+                          visitors["Service"]["NoNewPrivileges"]), ("1", "1", "yes"))
+        self.assertEqual((webapi["Service"]["User"], webapi["Service"]["Group"]),
+                         ("www-data", "www-data"))
+        self.assertNotIn("NoNewPrivileges", webapi["Service"])  # it is set-user-id root
+        for unit in visitors, webapi:
+            self.assertEqual(unit["Service"]["StandardInput"], "socket")
+            self.assertNotIn("SupplementaryGroups", unit["Service"])
+            self.assertEqual(unit["Unit"]["StartLimitIntervalSec"], "0")
 
 
 def main():

@@ -95,6 +95,8 @@ class Access(unittest.TestCase):
                              "frame-ancestors 'none'; base-uri 'none'")
             self.assertEqual(reply.get("X-Content-Type-Options"), "nosniff")
             self.assertEqual(reply.get("Referrer-Policy"), "no-referrer")
+            self.assertEqual(reply.get("X-Frame-Options"), "DENY")
+            self.assertEqual(reply.get("Cross-Origin-Opener-Policy"), "same-origin")
             self.assertEqual(reply.get("Cache-Control"), "no-cache")
 
     def test_large_requests_stay_outside(self):

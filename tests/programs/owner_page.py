@@ -72,6 +72,57 @@ class OwnerPage(browser.Browser):
         self.browser.refresh()
         self.wait_until_listed()
 
+    # ---- what goes to the server and comes back ----
+
+    def watch(self):
+        """From here on, until the page is loaded again, what it sends is kept, and answers can be
+        held back or replaced."""
+        self.browser.execute_script("""
+            Object.assign(window, {sent: [], held: [], rules: {}});
+            const real = window.fetch;
+            window.fetch = async (address, options) => {
+              const request = JSON.parse(options.body);
+              sent.push(request);
+              const rule = (rules[request.method] ?? []).shift();
+              if (rule && rule !== "hold") {
+                return rule(await real(address, options));
+              }
+              const response = await real(address, options);
+              if (rule === "hold") {
+                await new Promise((go) => held.push(go));
+              }
+              return response;
+            }""")
+
+    def sent(self, method):
+        """What was sent to a method, without what every request has."""
+        return [{name: value for name, value in request.items()
+                 if name not in ("api", "version", "method")}
+                for request in self.browser.execute_script("return sent")
+                if request["method"] == method]
+
+    def hold(self, method):
+        """The next answer of this method waits for let_go()."""
+        self.browser.execute_script("(rules[arguments[0]] ??= []).push('hold')", method)
+
+    def let_go(self):
+        self.wait_for(lambda: self.browser.execute_script("return held.length"),
+                      lambda seen: seen > 0)
+        self.browser.execute_script("held.splice(0).forEach((go) => go())")
+
+    def replace(self, method, script):
+        """The next answer of this method is what the script makes of the true `response`."""
+        self.browser.execute_script(
+            "(rules[arguments[0]] ??= []).push(async (response) => {" + script + "})", method)
+
+    def break_off(self, method):
+        """The next answer of this method ends in the middle."""
+        self.replace(method, """
+            return new Response(new ReadableStream({start(stream) {
+              stream.enqueue(new TextEncoder().encode('{"succ'));
+              setTimeout(() => stream.error(new TypeError("gone")), 100);
+            }}));""")
+
     # ---- the list ----
 
     def count(self):
@@ -182,6 +233,12 @@ class OwnerPage(browser.Browser):
         assert shown.startswith(start + "/sharing/"), shown
         return shown[len(start):]
 
+    def discard(self):
+        """Leaves a form in which something was changed."""
+        self.press_in("link", "Cancel")
+        self.press_in("question", "Discard")
+        self.assert_no_dialog()
+
     def save(self):
         self.press_in("link", "Save")
         self.assert_no_dialog()
@@ -202,6 +259,11 @@ class OwnerPage(browser.Browser):
 
     def summary(self):
         return self.browser.find_element(By.ID, "link-summary").text
+
+
+def make_links(*wanted):
+    """Links, each from its members as a dictionary."""
+    return vs.make_links([{"app": {"path": FILE}, **members} for members in wanted])
 
 
 def make_link(**members):

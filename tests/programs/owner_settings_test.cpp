@@ -338,6 +338,17 @@ TEST(OwnerSettings, DocumentsHaveAtMost64KiB) {
   }
 }
 
+TEST(OwnerSettings, DocumentsHoldAtMost10000Values) {
+  for (const char* name : {"app", "private_data"}) {
+    Json::Value document;
+    Json::Value& list = document["a"] = Json::Value(Json::arrayValue);
+    list.resize(10000 - 2);  // the object and the list are values, too
+    EXPECT_EQ(FaultyField(One(name, document)), "");
+    list.append(0);
+    EXPECT_EQ(FaultyField(One(name, document)), name);
+  }
+}
+
 TEST(OwnerSettings, LinkOfAnOlderProgramThatDoesNotFitTogetherCanStillBeRenamed) {
   Entry link = Link();
   link.set_redirect_type(Entry::REDIRECT_ALWAYS);

@@ -1,13 +1,19 @@
 #include "owner/shareable_file.h"
 
+#include <fcntl.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <array>
 #include <cerrno>
+#include <chrono>
+#include <csignal>
 #include <filesystem>
 #include <fstream>
+#include <functional>
+#include <iterator>
 
 #include "support/child.h"
 #include "support/syslog_listener.h"
@@ -175,6 +181,90 @@ TEST_F(OwnerShareableFile, UnknownAccountCannotBeAskedAndIsLogged) {
   const std::vector<std::string> lines = log.TakeTexts();
   ASSERT_EQ(lines.size(), 1U);
   EXPECT_EQ(lines[0].rfind("shareable_file:", 0), 0U);
+}
+
+// A process of alice's that holds a lease on a file of hers, so that the look at it takes a while,
+// and does `then` meanwhile.
+pid_t Lease(const std::string& path, const std::function<void()>& then) {
+  std::array<int, 2> ready{};
+  EXPECT_EQ(pipe(ready.data()), 0);
+  const pid_t holder = fork();
+  if (holder == 0) {
+    if (setresgid(2001, 2001, 2001) != 0 || setresuid(2001, 2001, 2001) != 0) {
+      _exit(1);
+    }
+    (void)std::signal(SIGIO, SIG_IGN);
+    const int fd = open(path.c_str(), O_RDWR);
+    if (fcntl(fd, F_SETLEASE, F_WRLCK) != 0 || write(ready[1], "x", 1) != 1) {
+      _exit(1);
+    }
+    then();
+    pause();
+    _exit(0);
+  }
+  char byte = 0;
+  close(ready[1]);
+  EXPECT_EQ(read(ready[0], &byte, 1), 1) << "no lease";
+  close(ready[0]);
+  return holder;
+}
+
+void End(pid_t holder) {
+  kill(holder, SIGKILL);
+  waitpid(holder, nullptr, 0);
+}
+
+TEST_F(OwnerShareableFile, LeaseThatIsNotGivenBackIsNotWaitedForLong) {
+  const pid_t holder = Lease("/tmp/share/alices", [] {});
+  const auto start = std::chrono::steady_clock::now();
+  EXPECT_EQ(Check("/tmp/share/alices"), FileAnswer::kNotReadable);
+  EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(4));
+  End(holder);
+  EXPECT_EQ(Check("/tmp/share/alices"), FileAnswer::kMay);
+}
+
+// Stops every other process of alice's that runs this test: the one that looks at her file.
+void StopTheLook() {
+  for (;;) {
+    for (const fs::directory_entry& entry : fs::directory_iterator("/proc")) {
+      const std::string name = entry.path().filename();
+      if (name.find_first_not_of("0123456789") != std::string::npos) {
+        continue;
+      }
+      std::ifstream status(entry.path() / "status");
+      const std::string text((std::istreambuf_iterator<char>(status)),
+                             std::istreambuf_iterator<char>());
+      if (name != std::to_string(getpid()) &&
+          text.find("Name:\towner_shareabl") != std::string::npos &&
+          text.find("Uid:\t2001\t2001\t2001\t2001") != std::string::npos) {
+        kill(std::stoi(name), SIGSTOP);
+        return;
+      }
+    }
+  }
+}
+
+// By a process that is not root, but can become it.
+TEST_F(OwnerShareableFile, LookThatItsOwnerStopsIsEndedAndLogged) {
+  tuvo_test::SyslogListener log;
+  const pid_t holder = Lease("/tmp/share/alices", StopTheLook);
+  EXPECT_EQ(tuvo_test::RunInChildAs(
+                {33, 33, 0, 33, 33, 33},
+                [this] {
+                  const auto start = std::chrono::steady_clock::now();
+                  const FileAnswer answer = Check("/tmp/share/alices");
+                  const auto took = std::chrono::steady_clock::now() - start;
+                  if (answer != FileAnswer::kCannotTell || took < std::chrono::seconds(4) ||
+                      took > std::chrono::seconds(8)) {
+                    return 1;
+                  }
+                  return waitpid(-1, nullptr, WNOHANG) == -1 && geteuid() == 33 ? 0 : 2;
+                }),
+            0);
+  End(holder);
+  const std::vector<std::string> lines = log.TakeTexts();
+  ASSERT_EQ(lines.size(), 1U);
+  EXPECT_NE(lines[0].find("timed out"), std::string::npos);
 }
 
 TEST_F(OwnerShareableFile, LeavesNoChildAndNoDescriptor) {

@@ -75,11 +75,20 @@ TEST_F(OwnerVisitors, StrangerHasAnAddressAndNoName) {
 }
 
 TEST_F(OwnerVisitors, AccountIsNamed) {
+  link_.set_protect_type(Entry::PROTECT_USER);
   Admit(link_, "192.0.2.7", 2002, 500);
   EXPECT_EQ(List().at(0).user, "bob");
 }
 
+TEST_F(OwnerVisitors, AccountProvedAtAnotherLinkIsNotNamed) {
+  Admit(link_, "192.0.2.7", 2002, 500);
+  EXPECT_EQ(List().at(0).user, "");
+  link_.set_protect_type(Entry::PROTECT_PASSWORD);
+  EXPECT_EQ(List().at(0).user, "");
+}
+
 TEST_F(OwnerVisitors, AccountThatIsGoneHasNoName) {
+  link_.set_protect_type(Entry::PROTECT_USER);
   Admit(link_, "192.0.2.7", 4711, 500);
   EXPECT_EQ(List().at(0).user, "");
 }

@@ -51,7 +51,7 @@ class Pages(BrowserTest):
         self.assert_rendered()
         self.picture("password")
         field = self.field("Password")
-        self.assertTrue(self.has_focus(field))
+        self.assert_focus(lambda: field)
         self.press("Open")  # an empty field is not sent
         self.assertNotIn("wrong", self.text())
         field.send_keys("guess", Keys.ENTER)
@@ -59,7 +59,7 @@ class Pages(BrowserTest):
         self.assert_rendered()
         self.picture("password-wrong")
         field = self.field("Password")
-        self.assertTrue(self.has_focus(field))
+        self.assert_focus(lambda: field)
         field.send_keys("tëa")
         self.press("Open")
         self.assert_file_arrives()
@@ -69,14 +69,14 @@ class Pages(BrowserTest):
         self.open("/sharing/" + link)
         self.assert_rendered()
         self.picture("account")
-        self.assertTrue(self.has_focus(self.field("Account name")))
+        self.assert_focus(lambda: self.field("Account name"))
         self.field("Account name").send_keys("bob")
         self.field("Account password").send_keys("bob-secret", Keys.ENTER)
         self.assert_says("This link is not for that account")
         self.picture("account-refused")
         name = self.field("Account name")
         self.assertEqual(name.get_attribute("value"), "bob")
-        self.assertTrue(self.has_focus(self.field("Account password")))
+        self.assert_focus(lambda: self.field("Account password"))
         name.clear()
         name.send_keys("carol")
         self.field("Account password").send_keys("carol-secret")
@@ -196,8 +196,8 @@ def main():
     with open(FILE, "wb") as file:
         file.write(CONTENT)
     with vs.WebServer() as SERVER:
-        return unittest.main(argv=sys.argv[:1] + sys.argv[3:], verbosity=2, exit=False)
+        return browser.run_tests()
 
 
 if __name__ == "__main__":
-    sys.exit(0 if main().result.wasSuccessful() else 1)
+    sys.exit(main())

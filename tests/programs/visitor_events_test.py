@@ -4,6 +4,7 @@ project's folder."""
 import http.client
 import os
 import re
+import sqlite3
 import sys
 import time
 import unittest
@@ -110,6 +111,17 @@ class Refusals(EventsTest):
         Visitor(SERVER).get(path_of(self.link), Cookie="sharing_sid=" + "x" * 32)
         self.assert_events(self.event("refusal", self.link, -5))
 
+    def test_by_a_look_at_the_head_alone(self):
+        Visitor(SERVER).request("HEAD", path_of(self.link), None,
+                                {"Cookie": "sharing_sid=" + "x" * 32})
+        self.assert_events(self.event("refusal", self.link, -5))
+
+    def test_link_whose_row_does_not_load(self):
+        event = self.event("login", self.link, -3)
+        sql("UPDATE entry SET data='[' WHERE hash=?", self.link)
+        Visitor(SERVER).post(path_of(self.link))
+        self.assert_events(event)
+
     def test_address_that_is_locked_out(self):
         link = make_file_link(FILE, protect_type="password", password="secret")
         visitor = Visitor(SERVER, "127.0.0.45")
@@ -176,6 +188,19 @@ class Logouts(EventsTest):
             visitor.post(path_of(link) + "/logout")
         Visitor(SERVER).post(path_of(link) + "/logout")
         self.assert_events(self.event("logout", link, 1))
+
+
+    def test_that_did_not_come_about(self):
+        link = make_file_link(FILE)
+        visitor = admitted(link)
+        self.take(1)
+        other = sqlite3.connect(vs.DATABASE, isolation_level=None)
+        other.execute("BEGIN IMMEDIATE")  # for longer than the program waits
+        self.assertEqual(visitor.post(path_of(link) + "/logout").status, 500)
+        other.execute("ROLLBACK")
+        other.close()
+        self.assert_events(self.event("logout", link, 0))
+        self.assertEqual(visitor.get(path_of(link)).status, 200)
 
 
 class Secrets(EventsTest):

@@ -26,6 +26,24 @@ TEST(VisitorPage, FormGoesToTheLink) {
   EXPECT_TRUE(Holds(html, "<h1>Shared link</h1>"));
 }
 
+TEST(VisitorPage, TitleThatShowsNothingIsReplaced) {
+  AdmissionForm form = Form(Ask::kNothing);
+  for (const char* title :
+       {" ", "\t\n", u8"\u200b\u200d", u8"\u00a0", u8"\u202e", u8"\u3164\u2800", u8"\U000e0041"}) {
+    form.title = title;
+    EXPECT_TRUE(Holds(FormHtml(form), "<h1>Shared link</h1>")) << title;
+  }
+}
+
+TEST(VisitorPage, TitleThatShowsSomethingIsKept) {
+  AdmissionForm form = Form(Ask::kNothing);
+  for (const char* title :
+       {"a", " \xc2\xa1 ", u8"\u200b\u6771", u8"\U0001f30d", "\xff", "\xe2\x80"}) {
+    form.title = title;
+    EXPECT_TRUE(Holds(FormHtml(form), std::string("<h1>") + title + "</h1>")) << title;
+  }
+}
+
 TEST(VisitorPage, PasswordFieldHasALabelAndTheFocus) {
   const std::string html = FormHtml(Form(Ask::kPassword));
   EXPECT_TRUE(Holds(html, "<label for=\"password\">Password</label>"));

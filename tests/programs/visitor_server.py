@@ -226,6 +226,13 @@ def make_link(**members):
     return done.stdout.decode().strip()
 
 
+def make_links(wanted):
+    """As many at once; their hashes."""
+    done = subprocess.run([_build + "/tests/programs/visitor_link_maker"],
+                          input=json.dumps(wanted).encode(), stdout=subprocess.PIPE, check=True)
+    return done.stdout.decode().split()
+
+
 def make_file_link(path, **members):
     return make_link(app={"path": path}, **members)
 

@@ -1,9 +1,14 @@
 """Which files the web API lets owners share, asked through both of its fronts. Arguments: the build
 folder, the project's folder."""
 
+import fcntl
 import os
 import shutil
+import signal
+import sqlite3
 import sys
+import threading
+import time
 import unittest
 
 import visitor_server as vs
@@ -232,6 +237,36 @@ class ByHttp(Files, unittest.TestCase):
     def test_path_with_a_zero_byte(self):
         make(SHARED + "/a")
         self.refuses(SHARED + "/a\0.txt")
+
+
+class Looking(unittest.TestCase):
+    def test_nobody_waits_for_it(self):
+        """A lease on the file delays the look at it; the database is free meanwhile."""
+        os.makedirs(SHARED, exist_ok=True)
+        path = make(SHARED + "/leased")
+        api = ws.ToolFront()
+        link = api.call("alice", "create", project_name="x").data["link"]
+        with open(path, "r+") as file:
+            signal.signal(signal.SIGIO, signal.SIG_IGN)
+            fcntl.fcntl(file, fcntl.F_SETLEASE, fcntl.F_WRLCK)
+            answers = []
+            asking = threading.Thread(target=lambda: answers.append(
+                api.call("alice", "set", id=link["id"], project_name="file", app={"path": path})))
+            start = time.monotonic()
+            asking.start()
+            others = 0
+            while asking.is_alive():
+                connection = sqlite3.connect(vs.DATABASE, timeout=0, isolation_level=None)
+                connection.execute("BEGIN IMMEDIATE")
+                connection.execute("ROLLBACK")
+                connection.close()
+                others += 1
+                asking.join(0.05)
+        self.assertEqual((answers[0].code, answers[0].field), (206, "app"))
+        self.assertTrue(1 < time.monotonic() - start < 5)
+        self.assertGreater(others, 10)
+        self.assertTrue(api.call("alice", "set", id=link["id"], project_name="file",
+                                 app={"path": path}).ok)
 
 
 class WithoutRoot(unittest.TestCase):

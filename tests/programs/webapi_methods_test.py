@@ -626,6 +626,10 @@ class Sessions(Methods):
             sql("INSERT INTO session VALUES (?,?,?,?,?)", row, f"session-id-{row}", uid, address, end)
             sql("INSERT INTO token VALUES (?,?,?,?)", row, self.kept["id"], row, end)
         try:
+            # A session with an account that it proved at another link.
+            self.assertEqual({one["user"] for one in self.done(
+                "alice", "sessions", id=self.kept["id"])["sessions"]}, {""})
+            self.done("alice", "set", id=self.kept["id"], protect_users=["bob"])
             for name in "id", "hash":
                 answer = self.done("alice", "sessions", **{name: self.kept[name]})
                 self.assertEqual(answer["total"], 3)
@@ -636,6 +640,7 @@ class Sessions(Methods):
                      ("192.0.2.3", "", moment(now + 1800 - time.time()))])
                 self.assertNotIn("session-id", json.dumps(answer))
         finally:
+            self.done("alice", "set", id=self.kept["id"], protect_type="none")
             sql("DELETE FROM session")
             sql("DELETE FROM token")
 

@@ -6,9 +6,11 @@ import os
 import re
 import resource
 import shutil
+import signal
 import stat
 import subprocess
 import sys
+import time
 import unittest
 
 import visitor_server as vs
@@ -188,15 +190,76 @@ class Surroundings(unittest.TestCase):
                                   preexec_fn=lambda: resource.setrlimit(which, (value, value)))
 
         for which, values in ((resource.RLIMIT_FSIZE, (0, 4096, 65536)),
-                              (resource.RLIMIT_NOFILE, (3, 4, 5, 6, 7)),
+                              (resource.RLIMIT_NOFILE, (*range(3, 16), 24, 31, 32, 33, 40)),
                               (resource.RLIMIT_AS, (30 << 20, 40 << 20)),
                               (resource.RLIMIT_NPROC, (0,))):
             for value in values:
-                done = limited(which, value)
+                before = vs.sql("SELECT COUNT(*) FROM entry")[0][0]
+                with vs.SystemLog() as log:
+                    done = limited(which, value)
+                made = vs.sql("SELECT COUNT(*) FROM entry")[0][0] - before
                 if done.returncode == 0:
                     self.assertTrue(json.loads(done.stdout)["success"])
+                    self.assertEqual(made, 1)
+                if done.returncode == 0 or which == resource.RLIMIT_NOFILE:
+                    done_events = [event for event in ws.events(log) if event["result"] == "1"]
+                    self.assertEqual(len(done_events), made, (which, value))
                 self.assertEqual(vs.sql("PRAGMA integrity_check"), [("ok",)])
         self.assertTrue(API.call("alice", "create", project_name="x").ok)
+
+    def test_few_descriptors_by_the_soft_limit_alone(self):
+        hard = resource.getrlimit(resource.RLIMIT_NOFILE)[1]
+        done = run_tool("alice", *START, "method=create", "project_name=x", preexec_fn=lambda:
+                        resource.setrlimit(resource.RLIMIT_NOFILE, (4, hard)))
+        self.assertEqual(done.returncode, 0)
+
+    def test_descriptors_that_the_caller_left_open(self):
+        def fill():
+            resource.setrlimit(resource.RLIMIT_NOFILE, (40, 40))
+            for _ in range(3, 40):
+                try:
+                    os.set_inheritable(os.dup(0), True)
+                except OSError:
+                    return
+
+        with vs.SystemLog() as log:
+            done = run_tool("alice", *START, "method=create", "project_name=x", preexec_fn=fill,
+                            close_fds=False)
+        self.assertEqual((done.returncode, len(ws.events(log))), (0, 1))
+
+    def test_caller_cannot_stop_it(self):
+        """A program that is stopped while it writes to the database would stop all others."""
+        reading, writing = os.pipe()
+        os.set_blocking(writing, False)
+        while True:  # its answer finds no room, and it stays
+            try:
+                os.write(writing, b"x" * 4096)
+            except BlockingIOError:
+                break
+        os.set_blocking(writing, True)
+        process = subprocess.Popen([ws.TOOL, *START, "method=list"], stdout=writing, user=2001,
+                                   group=2001, extra_groups=[], env=NOTHING, cwd="/")
+        try:
+            for _ in range(400):
+                with open(f"/proc/{process.pid}/status") as lines:
+                    status = dict(line.rstrip("\n").split(":\t", 1) for line in lines if ":\t" in line)
+                if status["Uid"].split()[:3] == ["1", "1", "0"]:
+                    break
+                time.sleep(0.05)
+            self.assertEqual(status["Uid"].split(), ["1", "1", "0", "1"])
+            self.assertEqual(status["Gid"].split()[:2], ["1", "1"])
+            ignored = int(status["SigIgn"], 16)
+            for number in signal.SIGTSTP, signal.SIGTTIN, signal.SIGTTOU:
+                self.assertTrue(ignored >> (number - 1) & 1, number)
+            done = subprocess.run(["/bin/sh", "-c", f"kill -STOP {process.pid}"], user=2001,
+                                  group=2001, extra_groups=[], env={"LC_ALL": "C"},
+                                  stderr=subprocess.PIPE)
+            self.assertNotEqual(done.returncode, 0)
+            self.assertIn(b"not permitted", done.stderr)
+        finally:
+            os.close(writing)
+            os.close(reading)
+            process.wait(60)
 
     def test_mask_of_the_caller_does_not_open_the_database(self):
         done = subprocess.run(["/bin/sh", "-c", f"umask 0; exec {ws.TOOL} --exec api=TUVO.Sharing.Link "
@@ -224,6 +287,7 @@ class EventLog(unittest.TestCase):
             API.call("bob", "set", id=link["id"], enabled=True)
             API.call("carol", "delete", id=link["id"])
             API.call("root", "delete_expired")
+            API.call("root", "delete_expired", dry_run=True)
             API.call("alice", "create")
             API.call("alice", "list")
             code(*START)
