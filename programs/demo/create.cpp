@@ -55,7 +55,8 @@ bool CreateLinks(const std::string& path, const std::string& owner) {
       .set_protect_groups({"administrators"});
 
   Entry limited = open;
-  limited.set_protect_title("For three readers").set_expire_times(kThreeUses);
+  // Not purged once used up: its address goes on saying so.
+  limited.set_protect_title("For three readers").set_expire_times(kThreeUses).set_auto_gc(false);
 
   Entry timed = open;
   timed.set_protect_title("Until tomorrow").set_expire_at(std::time(nullptr) + kOneDay);

@@ -48,6 +48,7 @@ Entry EntryOf(const Json::Value& wanted) {
       .set_expire_at(static_cast<long>(wanted.get("expire_at", 0).asInt64()))
       .set_expire_times(wanted.get("expire_times", 0).asInt())
       .set_use_count(wanted.get("use_count", 0).asInt())
+      .set_auto_gc(wanted.get("auto_gc", true).asBool())
       .set_enable_match_ip(wanted.get("enable_match_ip", true).asBool())
       .set_protect_type(ProtectTypeOf(wanted.get("protect_type", "none").asString()))
       .set_protect_title(wanted.get("protect_title", "").asString())
