@@ -84,6 +84,7 @@ void WaitForInput(int fd) {
 void EndBySignal(int signal) {
   (void)std::signal(signal, SIG_DFL);
   (void)std::raise(signal);
+  // cppcheck-suppress unreachableCode  ; a signal that is blocked does not end the process
   std::abort();
 }
 
