@@ -1,11 +1,8 @@
-#include "owner/link_store.h"
 #include "owner/moment.h"
 #include "owner/text_check.h"
 #include "owner/visitors.h"
-#include "webapi/database.h"
 #include "webapi/link_api.h"
-#include "webapi/link_name.h"
-#include "webapi/ownership.h"
+#include "webapi/named_link.h"
 
 namespace webapi {
 
@@ -24,16 +21,9 @@ Json::Value VisitorJson(const owner::Visitor& visitor) {
 }  // namespace
 
 owner::MaybeProblem SessionsMethod(Turn* turn) {
-  owner::LinkName name;
-  if (owner::MaybeProblem problem = ReadLinkName(turn->arguments, &name)) {
-    return problem;
-  }
   TUVO::sharing::db::BaseDB* db = nullptr;
-  if (owner::MaybeProblem problem = OpenDatabase(&db)) {
-    return problem;
-  }
   TUVO::sharing::record::Entry link;
-  if (owner::MaybeProblem problem = owner::FindLink(*db, name, ScopeOf(turn->account), &link)) {
+  if (owner::MaybeProblem problem = FindNamedLink(*turn, &db, &link)) {
     return problem;
   }
   std::vector<owner::Visitor> visitors;
