@@ -139,6 +139,94 @@ bool Admit(SharingDB& db, const Entry& entry, const char* sharing_sid, unsigned 
   return false;
 }
 
+// One use stricter than the link's own validity, so that a limit of N admits exactly N logins.
+bool IsUsedUp(const Entry& entry) {
+  return entry.get_expire_times() > 0 && entry.get_use_count() >= entry.get_expire_times();
+}
+
+// Holds the file for writing until it is committed or taken back. Within a transaction of the
+// caller's own this is none, and that one decides.
+class WriteTransaction {
+ public:
+  explicit WriteTransaction(SharingDB& db)
+      : db_(db), open_(db.Execute("BEGIN IMMEDIATE")), begun_(open_ || IsWithinAnother()) {}
+  ~WriteTransaction() {
+    if (open_) {
+      db_.Execute("ROLLBACK");
+    }
+  }
+  WriteTransaction(const WriteTransaction&) = delete;
+  WriteTransaction& operator=(const WriteTransaction&) = delete;
+
+  // False when the file could not be had, being locked by somebody else for one.
+  bool HasBegun() const { return begun_; }
+  bool Commit() { return !std::exchange(open_, false) || db_.Commit(); }
+
+ private:
+  // What SQLite says to a second BEGIN.
+  bool IsWithinAnother() const {
+    return db_.GetLastError().find("within a transaction") != std::string::npos;
+  }
+
+  SharingDB& db_;
+  bool open_;
+  bool begun_;
+};
+
+enum class Count {
+  kDone,
+  kFailed,
+  kUsedUp,  // nothing was written
+};
+
+// Whom a use is counted for.
+enum class CountFor {
+  kCaller,  // who has decided already: whatever the limit says
+  kLogin,   // only as long as the limit is not reached
+};
+
+Count CountUse(EntryDB& entries, const std::string& hash, CountFor whom) {
+  Entry entry;
+  if (!entries.GetByHash(hash, entry)) {
+    return Count::kFailed;
+  }
+  if (whom == CountFor::kLogin && IsUsedUp(entry)) {
+    return Count::kUsedUp;
+  }
+  entry.inc_use_count();
+  return entries.Update(entry) ? Count::kDone : Count::kFailed;
+}
+
+Count IncreaseUseCount(const std::string& hash, CountFor whom) {
+  SharingDB& db = SharingDB::Instance();
+  if (!db.IsGood()) {
+    return Count::kFailed;
+  }
+  EntryDB entries(db);  // checkpoints when the transaction is over
+  // The whole link is read and written back: what its owner, or another login, writes in between
+  // would be undone, a link that was just switched off would be on again.
+  WriteTransaction transaction(db);
+  if (!transaction.HasBegun()) {
+    return Count::kFailed;
+  }
+  const Count count = CountUse(entries, hash, whom);
+  return count == Count::kDone && !transaction.Commit() ? Count::kFailed : count;
+}
+
+// What may still be thrown, for want of memory, ends here: a caller in C could not catch it.
+template <typename Result, typename Operation>
+Result Contained(Operation operation, Result failure) {
+  try {
+    return operation();
+  } catch (const std::exception&) {
+    return failure;
+  }
+}
+
+Count CountLogin(const std::string& hash) {
+  return Contained([&] { return IncreaseUseCount(hash, CountFor::kLogin); }, Count::kFailed);
+}
+
 int Login(std::string& session_id, const _tag_sharing_login_params* params, bool skip_autoblock) {
   SharingDB& db = SharingDB::Instance();
   if (params == nullptr || !db.IsGood() || params->sharing_id == nullptr) {
@@ -157,8 +245,7 @@ int Login(std::string& session_id, const _tag_sharing_login_params* params, bool
   if (!entries.GetByHash(params->sharing_id, entry) || !entry.IsValid()) {
     return kNoValidLink;
   }
-  // One use stricter than the link's own validity, so that a limit of N admits exactly N logins.
-  if (entry.get_expire_times() > 0 && entry.get_use_count() >= entry.get_expire_times()) {
+  if (IsUsedUp(entry)) {
     return kUsedUp;
   }
   unsigned int uid = kNoUid;
@@ -171,8 +258,15 @@ int Login(std::string& session_id, const _tag_sharing_login_params* params, bool
     }
     return protection;
   }
-  if (!TuvoSharingIncreaseUseCount(params->sharing_id)) {
-    SHARING_LOG("update entry use count fail");
+  // The limit is decided again with the file held: other visitors may have taken the last uses
+  // since the link was read.
+  switch (CountLogin(params->sharing_id)) {
+    case Count::kDone:
+      break;
+    case Count::kUsedUp:
+      return kUsedUp;
+    case Count::kFailed:
+      SHARING_LOG("update entry use count fail");
   }
   if (!Admit(db, entry, params->sharing_sid, uid, session_id)) {
     return kFailed;
@@ -283,66 +377,6 @@ bool Logout(const std::string& hash, const std::string& session_id) {
   return tokens.Delete(token);
 }
 
-// Holds the file for writing until it is committed or taken back. Within a transaction of the
-// caller's own this is none, and that one decides.
-class WriteTransaction {
- public:
-  explicit WriteTransaction(SharingDB& db)
-      : db_(db), open_(db.Execute("BEGIN IMMEDIATE")), begun_(open_ || IsWithinAnother()) {}
-  ~WriteTransaction() {
-    if (open_) {
-      db_.Execute("ROLLBACK");
-    }
-  }
-  WriteTransaction(const WriteTransaction&) = delete;
-  WriteTransaction& operator=(const WriteTransaction&) = delete;
-
-  // False when the file could not be had, being locked by somebody else for one.
-  bool HasBegun() const { return begun_; }
-  bool Commit() { return !std::exchange(open_, false) || db_.Commit(); }
-
- private:
-  // What SQLite says to a second BEGIN.
-  bool IsWithinAnother() const {
-    return db_.GetLastError().find("within a transaction") != std::string::npos;
-  }
-
-  SharingDB& db_;
-  bool open_;
-  bool begun_;
-};
-
-bool CountUse(EntryDB& entries, const std::string& hash) {
-  Entry entry;
-  if (!entries.GetByHash(hash, entry)) {
-    return false;
-  }
-  entry.inc_use_count();
-  return entries.Update(entry);
-}
-
-bool IncreaseUseCount(const std::string& hash) {
-  SharingDB& db = SharingDB::Instance();
-  if (!db.IsGood()) {
-    return false;
-  }
-  EntryDB entries(db);  // checkpoints when the transaction is over
-  // The whole link is read and written back: what its owner, or another login, writes in between
-  // would be undone, a link that was just switched off would be on again.
-  WriteTransaction transaction(db);
-  return transaction.HasBegun() && CountUse(entries, hash) && transaction.Commit();
-}
-
-// What may still be thrown, for want of memory, ends here: a caller in C could not catch it.
-template <typename Result, typename Operation>
-Result Contained(Operation operation, Result failure) {
-  try {
-    return operation();
-  } catch (const std::exception&) {
-    return failure;
-  }
-}
-
 }  // namespace
 
 int TuvoSharingLogin(std::string& session_id, _tag_sharing_login_params* params,
@@ -359,7 +393,8 @@ bool TuvoSharingLogout(const std::string& hash, const std::string& session_id) {
 }
 
 bool TuvoSharingIncreaseUseCount(const std::string& hash) {
-  return Contained([&] { return IncreaseUseCount(hash); }, false);
+  return Contained([&] { return IncreaseUseCount(hash, CountFor::kCaller) == Count::kDone; },
+                   false);
 }
 
 }  // namespace TUVO

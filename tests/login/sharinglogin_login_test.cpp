@@ -12,6 +12,7 @@
 #include <limits>
 #include <set>
 
+#include "login/other_writer.h"
 #include "login/platform_spy.h"
 #include "login/visit.h"
 
@@ -319,6 +320,34 @@ TEST_F(LinkLogin, ALimitOfThreeAdmitsExactlyThreeLogins) {
   EXPECT_EQ(-11, Login(Visit(hash)).code);
   EXPECT_EQ(-11, Login(Visit(hash).Session(id)).code);
   EXPECT_EQ("3", UseCount());
+}
+
+// The link is read before the other visitor's use is there; the login then waits for the file, and
+// must see it when it counts.
+TEST_F(LinkLogin, WhoLosesTheLastUseToAnotherIsToldAsIfHeCameAfterwards) {
+  const std::string hash = MakeLimitedLink(3, 2);
+  const pid_t other = StartWriter("UPDATE entry SET use_count = 3");
+  const Reply reply = Login(Visit(hash));
+  int status = -1;
+  EXPECT_EQ(other, waitpid(other, &status, 0));
+  EXPECT_EQ(0, status);
+  EXPECT_EQ(-11, reply.code);
+  EXPECT_EQ(kUntouched, reply.session_id);
+  EXPECT_EQ(Lines{}, reply.log);
+  EXPECT_EQ("3", UseCount());
+  EXPECT_EQ("0", Sessions());
+  EXPECT_EQ("0", Tokens());
+  EXPECT_EQ(0, FailedLogins());
+}
+
+TEST_F(LinkLogin, TheLimitIsTheOneOfTheMomentOfCounting) {
+  const std::string hash = MakeLimitedLink(3, 2);
+  const pid_t owner = StartWriter("UPDATE entry SET use_count = 3, expire_times = 4, enabled = 0");
+  EXPECT_EQ(1, Login(Visit(hash)).code);
+  int status = -1;
+  EXPECT_EQ(owner, waitpid(owner, &status, 0));
+  EXPECT_EQ((std::vector<TextRow>{{"4", "4", "0"}}),
+            Rows("SELECT use_count, expire_times, enabled FROM entry"));
 }
 
 TEST_F(LinkLogin, WithoutALimitUsesDoNotMatter) {

@@ -5,9 +5,8 @@
 #include <unistd.h>
 
 #include <chrono>
-#include <thread>
 
-#include "db/sqlite_file.h"
+#include "login/other_writer.h"
 #include "login/visit.h"
 
 namespace tuvo_test {
@@ -25,6 +24,9 @@ bool NamesSharingLogin(const Lines& lines) {
   }
   return false;
 }
+
+// What another process writes meanwhile.
+constexpr char kChange[] = "UPDATE entry SET enabled = 0, use_count = 5";
 
 class LinkLogout : public VisitTest {};
 class UseCounting : public VisitTest {
@@ -160,32 +162,10 @@ TEST_F(UseCounting, GrowsByOne) {
   EXPECT_EQ((std::vector<TextRow>{{"2"}, {"0"}}), Rows("SELECT use_count FROM entry ORDER BY id"));
 }
 
-// Starts a process that has written to every link, tells so, and commits after a while.
-pid_t StartWriter(std::chrono::milliseconds hold = std::chrono::milliseconds(500)) {
-  int ends[2];
-  if (pipe(ends) != 0) {
-    return -1;
-  }
-  const pid_t writer = fork();
-  if (writer == 0) {
-    SqliteFile file(TUVO::sharing::SZF_SHARING_DB_PATH);
-    file.Execute("BEGIN IMMEDIATE; UPDATE entry SET enabled = 0, use_count = 5");
-    close(ends[1]);
-    std::this_thread::sleep_for(hold);
-    file.Execute("COMMIT");
-    _exit(0);
-  }
-  close(ends[1]);
-  char byte = 0;
-  EXPECT_EQ(0, read(ends[0], &byte, 1));  // it has closed its end
-  close(ends[0]);
-  return writer;
-}
-
 // The count waits for the other writer, and so must have read nothing before.
 TEST_F(UseCounting, UndoesNothingThatIsWrittenMeanwhile) {
   const std::string hash = MakeLink();
-  const pid_t writer = StartWriter();
+  const pid_t writer = StartWriter(kChange);
   const Reply reply = CountUse(hash);
   int status = -1;
   EXPECT_EQ(writer, waitpid(writer, &status, 0));
@@ -198,7 +178,7 @@ TEST_F(UseCounting, UndoesNothingThatIsWrittenMeanwhile) {
 // Which waits ten seconds, and must not go on without it then.
 TEST_F(UseCounting, FailsWhenTheFileStaysLocked) {
   const std::string hash = MakeLink();
-  const pid_t writer = StartWriter(std::chrono::milliseconds(11500));
+  const pid_t writer = StartWriter(kChange, std::chrono::milliseconds(11500));
   EXPECT_EQ(0, CountUse(hash).code);
   int status = -1;
   EXPECT_EQ(writer, waitpid(writer, &status, 0));
