@@ -21,6 +21,9 @@ constexpr unsigned int kNoId = std::numeric_limits<unsigned int>::max();
 // What is larger than the largest buffer is a broken source, not followed without end.
 constexpr std::size_t kFirstBuffer = 1024;
 constexpr std::size_t kLargestBuffer = std::size_t{64} << 20U;
+// Far beyond what any account is called. The system's own look-ups keep names on the stack, and
+// some end the process when there is no room (nss_systemd does at four mebibytes).
+constexpr std::size_t kLongestName = 1024;
 constexpr int kFirstGroups = 64;
 constexpr int kMostGroups = 1 << 20;
 
@@ -41,10 +44,21 @@ struct Entry {
   std::vector<char> memory;
 };
 
+template <typename Key>
+bool IsNobodys(Key /*id*/) {
+  return false;
+}
+bool IsNobodys(const char* name) {
+  return strnlen(name, kLongestName + 1) > kLongestName;
+}
+
 // Asks one of getpwnam_r, getpwuid_r, getgrnam_r and getgrgid_r. False when there is no such entry,
 // when the database cannot be read, or when the entry is larger than kLargestBuffer.
 template <typename Key, typename Record>
 bool Find(int (*query)(Key, Record*, char*, std::size_t, Record**), Key key, Entry<Record>* entry) {
+  if (IsNobodys(key)) {
+    return false;
+  }
   std::size_t size = kFirstBuffer;
   while (size <= kLargestBuffer) {
     entry->memory.resize(size);

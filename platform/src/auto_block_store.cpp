@@ -10,12 +10,13 @@
 #include <stdexcept>
 #include <system_error>
 
+#include "database_wait.h"
+
 namespace tuvo_platform {
 
 namespace {
 
 constexpr mode_t kMode = 0660;
-constexpr int kBusyMilliseconds = 10000;
 constexpr int64_t kLayout = 1;  // kept in the file as its user_version
 
 struct Finalizer {
@@ -83,7 +84,7 @@ AutoBlockStore::AutoBlockStore(const std::string& path) {
     throw std::runtime_error(database == nullptr ? sqlite3_errstr(status)
                                                  : sqlite3_errmsg(database));
   }
-  sqlite3_busy_timeout(database, kBusyMilliseconds);
+  SetBusyWait(database);
   Prepare();
 }
 

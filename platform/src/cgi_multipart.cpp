@@ -15,6 +15,14 @@ constexpr std::string_view kLineEnd = "\r\n";
 constexpr std::string_view kHeadersEnd = "\r\n\r\n";
 constexpr std::string_view kLastMark = "--";
 
+// One of dashes alone is well-formed too, but cgicc would find an ordinary delimiter within the
+// last one, and take what lies between for a piece of the last field.
+bool IsBoundary(std::string_view text) {
+  return text.size() <= kMaxBoundary &&
+         text.find_first_not_of(kBoundaryCharacters) == std::string_view::npos &&
+         text.find_first_not_of('-') != std::string_view::npos;
+}
+
 // What a part's Content-Disposition header says.
 struct Disposition {
   std::optional<std::string> name;
@@ -163,8 +171,7 @@ std::optional<std::string> MultipartBoundary(std::string_view content_type) {
     if (value.size() >= 2 && value.front() == '"' && value.back() == '"') {
       value = value.substr(1, value.size() - 2);
     }
-    if (value.empty() || value.size() > kMaxBoundary ||
-        value.find_first_not_of(kBoundaryCharacters) != std::string_view::npos) {
+    if (!IsBoundary(value)) {
       return std::nullopt;
     }
     return std::string(value);

@@ -10,7 +10,8 @@
 namespace tuvo_platform {
 
 // The boundary that the content type "multipart/form-data; boundary=..." names, without its
-// quotes; nothing when it names none that is well-formed (1 to 70 characters, RFC 2046).
+// quotes; nothing when it names none that is well-formed (1 to 70 characters, RFC 2046) and has
+// another character than dashes.
 std::optional<std::string> MultipartBoundary(std::string_view content_type);
 
 // Rewrites a body so that cgicc cannot misread it. cgicc looks for the boundary anywhere, also

@@ -2,23 +2,47 @@
 #include <sqlite3.h>
 #include <tuvoplatform/database.h>
 
+#include <cstring>
 #include <exception>
 #include <memory>
 #include <new>
 #include <string>
 
 #include "database_connection.h"
+#include "database_log.h"
 #include "database_result.h"
 #include "database_statement.h"
+#include "database_wait.h"
 
 namespace {
 
 using tuvo_platform::Connection;
 using tuvo_platform::kNoMemory;
 
+constexpr char kRollback[] = "ROLLBACK";
+
+bool RollBack(Connection* connection) {
+  const bool done = sqlite3_step(connection->rollback) == SQLITE_DONE;
+  if (!done) {
+    connection->error = sqlite3_errmsg(connection->sqlite);
+  }
+  sqlite3_reset(connection->rollback);
+  return done;
+}
+
+void RollBackIfOpen(Connection* connection) {
+  if (sqlite3_get_autocommit(connection->sqlite) == 0) {
+    sqlite3_step(connection->rollback);
+    sqlite3_reset(connection->rollback);
+  }
+}
+
 // Runs all statements of `sql`. On a failure its text is in `connection->error`.
 bool RunAll(Connection* connection, const char* sql, std::unique_ptr<DBResult_tag>* rows) {
   try {
+    if (std::strcmp(sql, kRollback) == 0) {
+      return RollBack(connection);
+    }
     while (*sql != '\0') {
       if (tuvo_platform::RunStatement(connection->sqlite, sql, &sql, rows) != SQLITE_OK) {
         connection->error = sqlite3_errmsg(connection->sqlite);
@@ -32,10 +56,13 @@ bool RunAll(Connection* connection, const char* sql, std::unique_ptr<DBResult_ta
   }
 }
 
-void RollBackIfOpen(sqlite3* sqlite) {
-  if (sqlite3_get_autocommit(sqlite) == 0) {
-    sqlite3_exec(sqlite, "ROLLBACK", nullptr, nullptr, nullptr);
-  }
+// Opens the file and makes ready what the connection needs.
+bool Open(Connection* connection, const char* path) {
+  return sqlite3_open_v2(path, &connection->sqlite, SQLITE_OPEN_READWRITE | SQLITE_OPEN_CREATE,
+                         nullptr) == SQLITE_OK &&
+         tuvo_platform::SetBusyWait(connection->sqlite) == SQLITE_OK &&
+         sqlite3_prepare_v3(connection->sqlite, kRollback, -1, SQLITE_PREPARE_PERSISTENT,
+                            &connection->rollback, nullptr) == SQLITE_OK;
 }
 
 }  // namespace
@@ -46,12 +73,10 @@ TUVODB* TUVODBConnect(const char* /*host*/, const char* /*user*/, const char* /*
     return nullptr;
   }
   std::unique_ptr<Connection> connection(new (std::nothrow) Connection());
-  if (connection == nullptr ||
-      sqlite3_open_v2(path, &connection->sqlite, SQLITE_OPEN_READWRITE | SQLITE_OPEN_CREATE,
-                      nullptr) != SQLITE_OK ||
-      tuvo_platform::SetBusyWait(connection->sqlite) != SQLITE_OK) {
+  if (connection == nullptr || !Open(connection.get(), path)) {
     return nullptr;
   }
+  tuvo_platform::KeepLogShort(connection->sqlite);
   return connection.release();
 }
 
@@ -71,7 +96,7 @@ int TUVODBExecute(TUVODB* db, const char* sql, DBResult_tag** result) {
   std::unique_ptr<DBResult_tag> rows;
   if (!RunAll(connection, sql, &rows)) {
     if (!callers_transaction) {
-      RollBackIfOpen(db->sqlite);
+      RollBackIfOpen(connection);
     }
     return -1;
   }

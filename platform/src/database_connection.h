@@ -14,11 +14,17 @@ struct Connection : TUVODB_tag {
   Connection() : TUVODB_tag{} {}
   // close_v2: a statement that the caller prepared on `sqlite` may still be there; the connection
   // then ends with it instead of staying open for good.
-  ~Connection() { sqlite3_close_v2(sqlite); }
+  ~Connection() {
+    sqlite3_finalize(rollback);
+    sqlite3_close_v2(sqlite);
+  }
   Connection(const Connection&) = delete;
   Connection& operator=(const Connection&) = delete;
 
   std::string error;
+  // "ROLLBACK", made when the connection is: taking a transaction back must not fail for want of
+  // memory, or the file would stay locked for as long as the process lives.
+  sqlite3_stmt* rollback = nullptr;
 };
 
 // Short enough to need no memory of its own in a std::string.

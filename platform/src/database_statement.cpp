@@ -2,8 +2,11 @@
 
 #include <sqlite3.h>
 
+#include <chrono>
 #include <thread>
 #include <utility>
+
+#include "database_wait.h"
 
 namespace tuvo_platform {
 
@@ -66,12 +69,12 @@ class RemainingWait {
 
   // Sleeps a little before the next attempt; false when the time is up.
   bool Pause() {
-    const auto left = std::chrono::duration_cast<milliseconds>(deadline_ - Clock::now()) - kPause;
-    if (left <= milliseconds::zero()) {
+    left_ = std::chrono::duration_cast<milliseconds>(deadline_ - Clock::now()) - kPause;
+    if (left_ <= milliseconds::zero()) {
       return false;
     }
     std::this_thread::sleep_for(kPause);
-    sqlite3_busy_timeout(sqlite_, static_cast<int>(left.count()));
+    SetBusyWait(sqlite_, &left_);
     shortened_ = true;
     return true;
   }
@@ -79,14 +82,11 @@ class RemainingWait {
  private:
   sqlite3* sqlite_;
   Clock::time_point deadline_;
+  milliseconds left_ = kBusyWait;
   bool shortened_ = false;
 };
 
 }  // namespace
-
-int SetBusyWait(sqlite3* sqlite) {
-  return sqlite3_busy_timeout(sqlite, static_cast<int>(kBusyWait.count()));
-}
 
 // SQLite waits by itself where waiting can help the one lock it needs, but a change of the journal
 // mode that meets another process answers "busy" at once: it would have to give up a lock that it

@@ -2,7 +2,6 @@
 #ifndef PLATFORM_SRC_DATABASE_STATEMENT_H_
 #define PLATFORM_SRC_DATABASE_STATEMENT_H_
 
-#include <chrono>
 #include <memory>
 
 #include "database_result.h"
@@ -10,12 +9,6 @@
 struct sqlite3;
 
 namespace tuvo_platform {
-
-// How long a statement waits for a locked file.
-constexpr std::chrono::milliseconds kBusyWait{10000};
-
-// Makes the connection wait for locks, `kBusyWait` at most. Returns SQLite's code.
-int SetBusyWait(sqlite3* sqlite);
 
 // Runs the first statement of the zero-terminated `sql` to its end and points `*tail` behind it.
 // When it can return rows, `*rows` is replaced by what it returned; otherwise, and on failure,

@@ -167,6 +167,22 @@ TEST(Account, NullArgumentsAreAnsweredLikeUnknownNames) {
   EXPECT_EQ(nullptr, TLIBGroupInfoHashGet(nullptr, 1, 0));
 }
 
+// The system's own look-up would end the process.
+TEST(Account, NamesOfTenMebibytesAreNobodys) {
+  const std::string name(10U << 20U, 'x');
+  TUVOUSER* user = nullptr;
+  EXPECT_EQ(TUVOUserGet(name.c_str(), &user), -1);
+  EXPECT_EQ(user, nullptr);
+  unsigned int gid = 0;
+  EXPECT_EQ(TUVOGroupGetGID(name.c_str(), &gid), -1);
+  EXPECT_EQ(TLIBGroupInfoHashGet(name.c_str(), 1, 0), nullptr);
+  lookups = 0;
+  EXPECT_EQ(TUVOUserGet(std::string(1025, 'x').c_str(), &user), -1);
+  EXPECT_EQ(lookups, 0);
+  EXPECT_EQ(TUVOUserGet(std::string(1024, 'x').c_str(), &user), -1);
+  EXPECT_EQ(lookups, 1);
+}
+
 TEST(Account, FreeingNullIsAccepted) {
   TUVOUserFree(nullptr);
   TUVOGroupFree(nullptr);

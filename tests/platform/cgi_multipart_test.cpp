@@ -159,5 +159,11 @@ TEST(CgiMultipart, BadBoundariesAreRefused) {
   }
 }
 
+TEST(CgiMultipart, BoundaryOfDashesAloneIsRefused) {
+  EXPECT_FALSE(MultipartBoundary("multipart/form-data; boundary=-"));
+  EXPECT_FALSE(MultipartBoundary("multipart/form-data; boundary=\"" + std::string(70, '-') + "\""));
+  EXPECT_EQ(MultipartBoundary("multipart/form-data; boundary=-x-"), "-x-");
+}
+
 }  // namespace
 }  // namespace tuvo_platform
