@@ -1,6 +1,8 @@
 #include <alloca.h>
 #include <grp.h>
 #include <internal/base_db_private.h>
+#include <internal/contained.h>
+#include <internal/escaped.h>
 #include <internal/log.h>
 #include <internal/run_as.h>
 #include <pwd.h>
@@ -15,6 +17,7 @@
 #include <climits>
 #include <cstdio>
 #include <cstring>
+#include <exception>
 #include <memory>
 #include <new>
 #include <utility>
@@ -29,6 +32,9 @@ constexpr char kSetUp[] =
 
 // Scratch space above this would threaten the stack, of which a thread may have only 256 KiB.
 constexpr size_t kLargestStackScratch = size_t{64} * 1024;
+
+// Short enough to need no memory of its own in a std::string.
+constexpr char kNoMemory[] = "out of memory";
 
 // Hands a statement's rows to whoever asked for them, or frees them.
 void Deliver(DBResult_tag* rows, Result* result) {
@@ -48,7 +54,12 @@ std::string EscapeInto(char* scratch, size_t size, const std::string& text) {
     SHARING_LOG_PID("escape failed\n\n");
     return "";
   }
-  return {scratch, strnlen(scratch, size)};
+  try {
+    return {scratch, strnlen(scratch, size)};
+  } catch (const std::exception&) {
+    SHARING_LOG_PID("escape failed\n\n");
+    return "";
+  }
 }
 
 }  // namespace
@@ -126,24 +137,41 @@ bool BaseDBPrivate::Init() {
   return Execute(kSetUp, nullptr);
 }
 
+template <typename Operation>
+bool BaseDBPrivate::Answer(Operation operation) {
+  try {
+    return operation();
+  } catch (const EscapeFailed& failure) {
+    last_error_ = failure.what();
+  } catch (const std::exception&) {
+    last_error_ = kNoMemory;
+  }
+  return false;
+}
+
 bool BaseDBPrivate::IsGood() const {
   return handle_ != nullptr && good_;
 }
 
 bool BaseDBPrivate::Execute(const std::string& sql, Result* result) {
   DBResult_tag* rows = nullptr;
-  bool done = false;
-  if (!IsGood()) {
-    SHARING_LOG_PID("db is not good.\n\n");
-  } else if (sql.find('\0') != std::string::npos) {
-    // The platform would run what stands before the zero: another statement than the one meant.
-    last_error_ = "the statement holds a NUL byte";
-  } else {
-    last_query_ = sql;
-    done = ExecuteAsSystem(sql, &rows);
-  }
+  const bool done = Answer([&] { return ExecuteIfGood(sql, &rows); });
   Deliver(rows, result);
   return done;
+}
+
+bool BaseDBPrivate::ExecuteIfGood(const std::string& sql, DBResult_tag** rows) {
+  if (!IsGood()) {
+    SHARING_LOG_PID("db is not good.\n\n");
+    return false;
+  }
+  if (sql.find('\0') != std::string::npos) {
+    // The platform would run what stands before the zero: another statement than the one meant.
+    last_error_ = "the statement holds a NUL byte";
+    return false;
+  }
+  last_query_ = sql;
+  return ExecuteAsSystem(sql, rows);
 }
 
 bool BaseDBPrivate::ExecuteAsSystem(const std::string& sql, DBResult_tag** rows) {
@@ -176,7 +204,7 @@ bool BaseDBPrivate::Insert(const std::string& table, const std::vector<std::stri
   std::string sql = "INSERT INTO " + table + " VALUES (NULL,";
   const char* separator = "";
   for (const std::string& value : values) {
-    sql.append(separator).append("'").append(Escape(value)).append("'");
+    sql.append(separator).append("'").append(Escaped(*this, value)).append("'");
     separator = ",";
   }
   return Execute(sql + ")", nullptr);
@@ -190,7 +218,8 @@ bool BaseDBPrivate::Update(const std::string& table,
     if (column == "id") {
       continue;
     }
-    sql.append(separator).append(Escape(column)).append("='").append(Escape(value)).append("'");
+    sql.append(separator).append(Escaped(*this, column));
+    sql.append("='").append(Escaped(*this, value)).append("'");
     separator = ",";
   }
   return Execute(sql + " WHERE id=" + std::to_string(id), nullptr);
@@ -279,24 +308,24 @@ bool BaseDB::Execute(const std::string& sql, Result& result) {
 }
 
 bool BaseDB::Begin() {
-  return p_->Begin();
+  return p_->Answer([&] { return p_->Begin(); });
 }
 
 bool BaseDB::Commit() {
-  return p_->Commit();
+  return p_->Answer([&] { return p_->Commit(); });
 }
 
 bool BaseDB::Insert(const std::string& table, const std::vector<std::string>& values) {
-  return p_->Insert(table, values);
+  return p_->Answer([&] { return p_->Insert(table, values); });
 }
 
 bool BaseDB::Update(const std::string& table, const std::map<std::string, std::string>& fields,
                     int id) {
-  return p_->Update(table, fields, id);
+  return p_->Answer([&] { return p_->Update(table, fields, id); });
 }
 
 bool BaseDB::Delete(const std::string& table, int id) {
-  return p_->Delete(table, id);
+  return p_->Answer([&] { return p_->Delete(table, id); });
 }
 
 std::string BaseDB::Escape(const std::string& text) const {
@@ -308,19 +337,19 @@ bool BaseDB::GetLastInsertId(int& id) const {
 }
 
 std::string BaseDB::GetLastError() const {
-  return p_->GetLastError();
+  return Contained([&] { return p_->GetLastError(); }, std::string());
 }
 
 std::string BaseDB::GetLastQuery() const {
-  return p_->GetLastQuery();
+  return Contained([&] { return p_->GetLastQuery(); }, std::string());
 }
 
 bool BaseDB::ExecuteWALCheckPoint() {
-  return p_->ExecuteWALCheckPoint();
+  return p_->Answer([&] { return p_->ExecuteWALCheckPoint(); });
 }
 
 bool BaseDB::Vacuum() {
-  return p_->Execute("VACUUM", nullptr);
+  return p_->Answer([&] { return p_->Execute("VACUUM", nullptr); });
 }
 
 bool BaseDB::IsRoot() const {

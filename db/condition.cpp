@@ -1,4 +1,6 @@
 #include <internal/condition_private.h>
+#include <internal/contained.h>
+#include <internal/escaped.h>
 #include <tuvosharing/base_db.h>
 #include <tuvosharing/condition.h>
 
@@ -8,24 +10,44 @@ namespace {
 
 constexpr int kUnset = -1;
 
+// No statement runs with this, whatever follows it. Short enough, like the clause in it, to need no
+// memory of its own in a std::string.
+constexpr char kRefused[] = " WHERE )";
+constexpr char kRefusedClause[] = ")";
+
+// False when memory does not suffice.
+template <typename Items, typename MakeItem>
+bool Append(Items& items, MakeItem make_item) {
+  return Contained([&] {
+    items.push_back(make_item());
+    return true;
+  });
+}
+
 }  // namespace
 
-ConditionPrivate::ConditionPrivate(BaseDB& db) : db_(db), offset_(kUnset), limit_(kUnset) {}
+ConditionPrivate::ConditionPrivate(BaseDB& db) : db_(db), offset_(kUnset), limit_(kUnset) {
+  wheres_.reserve(1);  // for Refuse
+}
 
 void ConditionPrivate::Where(const std::string& sql, bool is_and) {
-  if (!sql.empty()) {
-    wheres_.push_back({"", "", sql, is_and});
+  if (!sql.empty() && !Append(wheres_, [&] { return _tag_where__{"", "", sql, is_and}; })) {
+    Refuse();
   }
 }
 
 void ConditionPrivate::Where(const std::string& column, const std::string& value, bool is_and) {
-  if (!column.empty()) {
-    wheres_.push_back({column, value, "", is_and});
+  if (!column.empty() && !Append(wheres_, [&] {
+        return _tag_where__{column, value, "", is_and};
+      })) {
+    Refuse();
   }
 }
 
 void ConditionPrivate::OrderBy(const std::string& column, bool ascending) {
-  orders_.push_back({column, ascending});
+  if (!Append(orders_, [&] { return _tag_order__{column, ascending}; })) {
+    Refuse();
+  }
 }
 
 void ConditionPrivate::Limit(int offset, int limit) {
@@ -52,6 +74,15 @@ bool ConditionPrivate::IsEmpty() const {
 }
 
 std::string ConditionPrivate::GetSQL() const {
+  return Contained([&] { return Render(); }, std::string(kRefused));
+}
+
+void ConditionPrivate::Refuse() {
+  wheres_.clear();
+  wheres_.push_back({"", "", kRefusedClause, true});
+}
+
+std::string ConditionPrivate::Render() const {
   std::string sql;
   bool first = true;
   for (const _tag_where__& where : wheres_) {
@@ -60,14 +91,14 @@ std::string ConditionPrivate::GetSQL() const {
     if (where.column.empty()) {
       sql += where.raw;
     } else {
-      sql += "`" + db_.Escape(where.column) + "` = '" + db_.Escape(where.value) + "'";
+      sql += "`" + Escaped(db_, where.column) + "` = '" + Escaped(db_, where.value) + "'";
     }
   }
   first = true;
   for (const _tag_order__& order : orders_) {
     sql += first ? " ORDER BY " : ",";
     first = false;
-    sql += db_.Escape(order.column) + (order.ascending ? " ASC" : " DESC");
+    sql += Escaped(db_, order.column) + (order.ascending ? " ASC" : " DESC");
   }
   if (limit_ > 0) {
     sql += " LIMIT " + std::to_string(limit_);

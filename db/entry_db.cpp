@@ -1,4 +1,6 @@
+#include <internal/contained.h>
 #include <internal/entry_db_private.h>
+#include <internal/escaped.h>
 #include <internal/lookup.h>
 #include <internal/object_db_query.h>
 #include <internal/user_id.h>
@@ -41,10 +43,12 @@ bool EntryDBPrivate::CreateWithHash(record::Entry& entry) {
   bool created = false;
   do {
     ++attempt;
-    std::string hash;
-    random.getString(RANDOM::POOL_ALPHA_NUMERIC, length, hash);
-    entry.set_hash(hash);
-    created = Create(entry.GetObject());
+    created = Contained([&] {
+      std::string hash;
+      random.getString(RANDOM::POOL_ALPHA_NUMERIC, length, hash);
+      entry.set_hash(hash);
+      return Create(entry.GetObject());
+    });
     if (attempt % kAttemptsPerLength == 0) {
       ++length;
     }
@@ -53,36 +57,44 @@ bool EntryDBPrivate::CreateWithHash(record::Entry& entry) {
 }
 
 bool EntryDBPrivate::GetByHash(const std::string& hash, record::Entry& entry) const {
-  return FetchFirst(
-      GetDB(),
-      std::string("SELECT * FROM ") + GetTable() + " WHERE hash = '" + GetDB().Escape(hash) + "'",
-      entry);
+  return Contained([&] {
+    return FetchFirst(GetDB(),
+                      std::string("SELECT * FROM ") + GetTable() + " WHERE hash = '" +
+                          Escaped(GetDB(), hash) + "'",
+                      entry);
+  });
 }
 
 bool EntryDBPrivate::DeleteByOwnerUid(unsigned int uid) {
-  return GetDB().Execute(
-      std::string("DELETE FROM ") + GetTable() + " WHERE owner_uid = " + std::to_string(uid),
-      nullptr);
+  return Contained([&] {
+    return GetDB().Execute(
+        std::string("DELETE FROM ") + GetTable() + " WHERE owner_uid = " + std::to_string(uid),
+        nullptr);
+  });
 }
 
 bool EntryDBPrivate::PurgeExpired(float probability) {
   if (!IsProbabilityHit(probability)) {
     return true;
   }
-  return GetDB().Execute(
-      std::string("DELETE FROM ") + GetTable() + " WHERE auto_gc = 1 AND " + ExpiredClause(),
-      nullptr);
+  return Contained([&] {
+    return GetDB().Execute(
+        std::string("DELETE FROM ") + GetTable() + " WHERE auto_gc = 1 AND " + ExpiredClause(),
+        nullptr);
+  });
 }
 
 bool EntryDBPrivate::PurgeExpiredByOwnerProject(unsigned int uid, const std::string& project) {
-  std::string sql = std::string("DELETE FROM ") + GetTable() + " WHERE";
-  if (uid != UID_ERR) {
-    sql += " owner_uid = " + std::to_string(uid) + " AND";
-  }
-  if (!project.empty()) {
-    sql += " project_name = '" + GetDB().Escape(project) + "' AND";
-  }
-  return GetDB().Execute(sql + ExpiredClause(), nullptr);
+  return Contained([&] {
+    std::string sql = std::string("DELETE FROM ") + GetTable() + " WHERE";
+    if (uid != UID_ERR) {
+      sql += " owner_uid = " + std::to_string(uid) + " AND";
+    }
+    if (!project.empty()) {
+      sql += " project_name = '" + Escaped(GetDB(), project) + "' AND";
+    }
+    return GetDB().Execute(sql + ExpiredClause(), nullptr);
+  });
 }
 
 EntryDB::EntryDB(BaseDB& db) : p_(std::make_unique<EntryDBPrivate>(db)) {}

@@ -1,3 +1,4 @@
+#include <internal/contained.h>
 #include <internal/purge.h>
 #include <tuvosharing/base_db.h>
 #include <tuvosharing/utils.h>
@@ -12,9 +13,11 @@ bool PurgeTimedOut(BaseDB& db, const char* table, float probability) {
     return true;
   }
   // The quotes do no harm to the comparison: the column has integer affinity.
-  return db.Execute(std::string("DELETE FROM ") + table + " WHERE timeout < '" +
-                        std::to_string(std::time(nullptr)) + "'",
-                    nullptr);
+  return Contained([&] {
+    return db.Execute(std::string("DELETE FROM ") + table + " WHERE timeout < '" +
+                          std::to_string(std::time(nullptr)) + "'",
+                      nullptr);
+  });
 }
 
 }  // namespace TUVO::sharing::db

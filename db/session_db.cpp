@@ -1,3 +1,5 @@
+#include <internal/contained.h>
+#include <internal/escaped.h>
 #include <internal/lookup.h>
 #include <internal/object_db_query.h>
 #include <internal/purge.h>
@@ -23,27 +25,33 @@ bool SessionDBPrivate::CreateWithSessionId(record::Session& session) {
   bool created = false;
   do {
     ++attempt;
-    std::string session_id;
-    random.getString(RANDOM::POOL_URL_FRIENDLY, static_cast<unsigned int>(SHARING_SESSION_LENGTH),
-                     session_id);
-    session.set_session_id(session_id);
-    created = Create(session.GetObject());
+    created = Contained([&] {
+      std::string session_id;
+      random.getString(RANDOM::POOL_URL_FRIENDLY, static_cast<unsigned int>(SHARING_SESSION_LENGTH),
+                       session_id);
+      session.set_session_id(session_id);
+      return Create(session.GetObject());
+    });
   } while (SHARING_MAX_RETRY_TIMES >= attempt && !created);
   return created;
 }
 
 bool SessionDBPrivate::GetBySessionId(const std::string& sessionId,
                                       record::Session& session) const {
-  return FetchFirst(GetDB(),
-                    std::string("SELECT * FROM ") + GetTable() + " WHERE session_id = '" +
-                        GetDB().Escape(sessionId) + "'",
-                    session);
+  return Contained([&] {
+    return FetchFirst(GetDB(),
+                      std::string("SELECT * FROM ") + GetTable() + " WHERE session_id = '" +
+                          Escaped(GetDB(), sessionId) + "'",
+                      session);
+  });
 }
 
 bool SessionDBPrivate::DeleteBySessionId(const std::string& sessionId) {
-  return GetDB().Execute(std::string("DELETE FROM ") + GetTable() + " WHERE session_id = '" +
-                             GetDB().Escape(sessionId) + "'",
-                         nullptr);
+  return Contained([&] {
+    return GetDB().Execute(std::string("DELETE FROM ") + GetTable() + " WHERE session_id = '" +
+                               Escaped(GetDB(), sessionId) + "'",
+                           nullptr);
+  });
 }
 
 bool SessionDBPrivate::PurgeExpired(float probability) {

@@ -1,3 +1,4 @@
+#include <internal/contained.h>
 #include <internal/lookup.h>
 #include <internal/object_db_query.h>
 #include <internal/purge.h>
@@ -17,17 +18,21 @@ bool TokenDBPrivate::Delete(int id) {
 
 bool TokenDBPrivate::GetBySessionEntry(const record::Session& session, const record::Entry& entry,
                                        record::Token& token) const {
-  return FetchFirst(GetDB(),
-                    std::string("SELECT * FROM ") + GetTable() +
-                        " WHERE session_id = " + std::to_string(session.get_id()) +
-                        " AND entry_id = " + std::to_string(entry.get_id()),
-                    token);
+  return Contained([&] {
+    return FetchFirst(GetDB(),
+                      std::string("SELECT * FROM ") + GetTable() +
+                          " WHERE session_id = " + std::to_string(session.get_id()) +
+                          " AND entry_id = " + std::to_string(entry.get_id()),
+                      token);
+  });
 }
 
 bool TokenDBPrivate::PurgeByEntry(const record::Entry& entry) {
-  return GetDB().Execute(std::string("DELETE FROM ") + GetTable() +
-                             " WHERE entry_id = " + std::to_string(entry.get_id()),
-                         nullptr);
+  return Contained([&] {
+    return GetDB().Execute(std::string("DELETE FROM ") + GetTable() +
+                               " WHERE entry_id = " + std::to_string(entry.get_id()),
+                           nullptr);
+  });
 }
 
 bool TokenDBPrivate::PurgeExpired(float probability) {

@@ -1,4 +1,5 @@
 // The four operations of the login API. They live in one file because the log lines of all name it.
+#include <internal/contained.h>
 #include <internal/log.h>
 #include <internal/user_access.h>
 #include <tuvoplatform/auto_block.h>
@@ -9,7 +10,6 @@
 #include <tuvosharing/token_db.h>
 
 #include <ctime>
-#include <exception>
 #include <limits>
 #include <utility>
 
@@ -18,6 +18,7 @@ namespace TUVO {
 namespace {
 
 using sharing::CheckUserAccess;
+using sharing::Contained;
 using sharing::GetRemoteIP;
 using sharing::db::EntryDB;
 using sharing::db::SessionDB;
@@ -125,13 +126,14 @@ bool Admit(SharingDB& db, const Entry& entry, const char* sharing_sid, unsigned 
   Session session;
   Token token;
   std::string ip;
-  if (db.IsGood() && GetRemoteIP(ip) && TakeSession(sessions, sharing_sid, ip, session) &&
-      TakeToken(tokens, session, entry, token)) {
+  if (db.IsGood() && GetRemoteIP(ip) && TakeSession(sessions, sharing_sid, ip, session)) {
+    // Copied before there is a token: without memory for it later, one would stay behind.
+    std::string text = session.get_session_id();
     if (entry.get_protect_type() == Entry::PROTECT_USER) {
       session.set_uid(uid);
     }
-    if (sessions.Update(session)) {
-      session_id = session.get_session_id();
+    if (TakeToken(tokens, session, entry, token) && sessions.Update(session)) {
+      session_id = std::move(text);
       return true;
     }
   }
@@ -211,16 +213,6 @@ Count IncreaseUseCount(const std::string& hash, CountFor whom) {
   }
   const Count count = CountUse(entries, hash, whom);
   return count == Count::kDone && !transaction.Commit() ? Count::kFailed : count;
-}
-
-// What may still be thrown, for want of memory, ends here: a caller in C could not catch it.
-template <typename Result, typename Operation>
-Result Contained(Operation operation, Result failure) {
-  try {
-    return operation();
-  } catch (const std::exception&) {
-    return failure;
-  }
 }
 
 Count CountLogin(const std::string& hash) {
@@ -378,6 +370,8 @@ bool Logout(const std::string& hash, const std::string& session_id) {
 }
 
 }  // namespace
+
+// What may still be thrown, for want of memory, ends in each: a caller in C could not catch it.
 
 int TuvoSharingLogin(std::string& session_id, _tag_sharing_login_params* params,
                      bool skip_autoblock) {

@@ -8,6 +8,8 @@
 #include <tuvosharing/user_group.h>
 #include <tuvosharing/utils.h>
 
+#include <utility>
+
 namespace TUVO::sharing::record {
 
 namespace {
@@ -236,19 +238,24 @@ void EntryPrivate::ToJSON(Json::Value& value) const {
 }
 
 bool EntryPrivate::FromRow(const db::Row& row) {
-  id_ = row.GetField(SZK_ID_).AsInt(0);
-  key_ = row.GetField(SZK_HASH).AsString("");
-  project_name_ = row.GetField(SZK_PROJECT_NAME).AsString("");
+  // So that a row that memory does not suffice for changes nothing: half of it would be a link
+  // without its protection.
+  EntryPrivate read(*this);
+  read.id_ = row.GetField(SZK_ID_).AsInt(0);
+  read.key_ = row.GetField(SZK_HASH).AsString("");
+  read.project_name_ = row.GetField(SZK_PROJECT_NAME).AsString("");
   db::Field enabled = row.GetField(SZK_ENABLED_);
   // A row without the value is a link that nobody switched off.
-  enabled_ = enabled.AsString("").empty() || enabled.AsBool(true);
-  owner_uid_ = row.GetField(SZK_OWNER_UID).AsUInt(UID_ERR);
-  start_at_ = row.GetField(SZK_START_AT).AsTime(0);
-  expire_at_ = row.GetField(SZK_EXPIRE_AT).AsTime(0);
-  expire_times_ = row.GetField(SZK_EXPIRE_TIMES).AsInt(0);
-  use_count_ = row.GetField(SZK_USE_COUNT).AsInt(0);
-  auto_gc_ = row.GetField(SZK_AUTO_GC).AsInt(0) != 0;
-  return DataFromText(row.GetField(SZK_DATA).AsString("")) && IsLegal();
+  read.enabled_ = enabled.AsString("").empty() || enabled.AsBool(true);
+  read.owner_uid_ = row.GetField(SZK_OWNER_UID).AsUInt(UID_ERR);
+  read.start_at_ = row.GetField(SZK_START_AT).AsTime(0);
+  read.expire_at_ = row.GetField(SZK_EXPIRE_AT).AsTime(0);
+  read.expire_times_ = row.GetField(SZK_EXPIRE_TIMES).AsInt(0);
+  read.use_count_ = row.GetField(SZK_USE_COUNT).AsInt(0);
+  read.auto_gc_ = row.GetField(SZK_AUTO_GC).AsInt(0) != 0;
+  const bool has_data = read.DataFromText(row.GetField(SZK_DATA).AsString(""));
+  *this = std::move(read);
+  return has_data && IsLegal();
 }
 
 }  // namespace TUVO::sharing::record

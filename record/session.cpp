@@ -41,11 +41,13 @@ void SessionPrivate::ToJSON(Json::Value& value) const {
 }
 
 bool SessionPrivate::FromRow(const db::Row& row) {
-  id_ = row.GetField(SZK_ID_).AsInt(0);
-  key_ = row.GetField(SZK_SESSION_ID_).AsString("");
-  uid_ = row.GetField(SZK_UID_).AsUInt(UID_ERR);
-  ip_ = row.GetField(SZK_IP_).AsString("");
-  timeout_ = row.GetField(SZK_TIMEOUT).AsTime(0);
+  SessionPrivate read(*this);  // so that a row that memory does not suffice for changes nothing
+  read.id_ = row.GetField(SZK_ID_).AsInt(0);
+  read.key_ = row.GetField(SZK_SESSION_ID_).AsString("");
+  read.uid_ = row.GetField(SZK_UID_).AsUInt(UID_ERR);
+  read.ip_ = row.GetField(SZK_IP_).AsString("");
+  read.timeout_ = row.GetField(SZK_TIMEOUT).AsTime(0);
+  *this = std::move(read);
   return IsLegal();
 }
 

@@ -37,10 +37,12 @@ void TokenPrivate::ToJSON(Json::Value& value) const {
 }
 
 bool TokenPrivate::FromRow(const db::Row& row) {
-  id_ = row.GetField(SZK_ID_).AsInt(0);
-  entry_id_ = row.GetField(SZK_ENTRY_ID).AsInt(0);
-  session_id_ = row.GetField(SZK_SESSION_ID_).AsInt(0);
-  timeout_ = row.GetField(SZK_TIMEOUT).AsTime(0);
+  TokenPrivate read(*this);  // so that a row that memory does not suffice for changes nothing
+  read.id_ = row.GetField(SZK_ID_).AsInt(0);
+  read.entry_id_ = row.GetField(SZK_ENTRY_ID).AsInt(0);
+  read.session_id_ = row.GetField(SZK_SESSION_ID_).AsInt(0);
+  read.timeout_ = row.GetField(SZK_TIMEOUT).AsTime(0);
+  *this = std::move(read);
   return IsLegal();
 }
 

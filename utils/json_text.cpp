@@ -2,7 +2,10 @@
 #include <json/reader.h>
 #include <json/writer.h>
 
+#include <cstring>
 #include <memory>
+#include <new>
+#include <sstream>
 
 namespace TUVO::sharing {
 
@@ -35,7 +38,12 @@ Json::CharReaderBuilder Reader() {
 
 std::string JsonToText(const Json::Value& value) {
   static const Json::StreamWriterBuilder builder = CompactWriter();
-  return Json::writeString(builder, value);
+  const std::unique_ptr<Json::StreamWriter> writer(builder.newStreamWriter());
+  std::ostringstream text;
+  // Or memory that runs out in the middle would leave the rest away without a word.
+  text.exceptions(std::ios_base::badbit);
+  writer->write(value, &text);
+  return text.str();
 }
 
 bool TextToJson(const std::string& text, Json::Value& value) {
@@ -43,8 +51,15 @@ bool TextToJson(const std::string& text, Json::Value& value) {
   const std::unique_ptr<Json::CharReader> reader(builder.newCharReader());
   try {
     return reader->parse(text.data(), text.data() + text.size(), &value, nullptr);
-  } catch (const Json::Exception&) {
+  } catch (const Json::Exception& error) {
+    RaiseIfOutOfMemory(error);
     return false;  // nested too deeply
+  }
+}
+
+void RaiseIfOutOfMemory(const Json::Exception& error) {
+  if (std::strstr(error.what(), "Failed to allocate") != nullptr) {
+    throw std::bad_alloc();
   }
 }
 

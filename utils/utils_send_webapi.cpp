@@ -1,3 +1,4 @@
+#include <internal/json_text.h>
 #include <internal/log.h>
 #include <internal/popen.h>
 #include <json/reader.h>
@@ -39,7 +40,8 @@ std::string ReadAll(FILE* file) {
 bool Parse(const std::string& text, Json::Value& value) {
   try {
     return Json::Reader().parse(text, value, false);
-  } catch (const Json::Exception&) {
+  } catch (const Json::Exception& error) {
+    RaiseIfOutOfMemory(error);
     return false;  // nested too deeply
   }
 }

@@ -34,11 +34,17 @@ class BaseDBPrivate {
   bool IsRoot() const;
   bool MoveRootDB() const;
 
+  // What `operation` answers; false, with a reason in the last error, when it throws: the texts
+  // that it makes did not fit, or one could not be escaped.
+  template <typename Operation>
+  bool Answer(Operation operation);
+
  private:
   explicit BaseDBPrivate(std::string path);
   bool Create(unsigned int mode) const;
   bool Connect();
   bool Init();
+  bool ExecuteIfGood(const std::string& sql, DBResult_tag** rows);
   bool ExecuteAsSystem(const std::string& sql, DBResult_tag** rows);
 
   bool good_ = true;

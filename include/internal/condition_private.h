@@ -20,6 +20,8 @@ class ConditionPrivate {
   void Page(int page, int size);
   void Clear();
   bool IsEmpty() const;
+  // A text that no statement runs with, when a clause is missing, or cannot be written, for want of
+  // memory: without its filter a statement would find, or delete, other rows than those meant.
   std::string GetSQL() const;
 
  private:
@@ -35,6 +37,10 @@ class ConditionPrivate {
     bool ascending;
   };
   // NOLINTEND(bugprone-reserved-identifier)
+
+  // Takes a clause that no statement runs with in the place of all others, until Clear.
+  void Refuse();
+  std::string Render() const;
 
   BaseDB& db_;
   std::vector<_tag_where__> wheres_;

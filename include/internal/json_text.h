@@ -20,6 +20,11 @@ std::string JsonToText(const Json::Value& value);
 // throws for any text.
 bool TextToJson(const std::string& text, Json::Value& value);
 
+// jsoncpp throws the same exception for a document that is nested too deeply and for want of
+// memory, and only its text tells them apart. Throws std::bad_alloc in the second case: a document
+// for which there is no memory must not be taken for none.
+void RaiseIfOutOfMemory(const Json::Exception& error);
+
 }  // namespace TUVO::sharing
 
 #endif  // INTERNAL_JSON_TEXT_H_

@@ -2,12 +2,14 @@
 #ifndef INTERNAL_OBJECT_DB_QUERY_H_
 #define INTERNAL_OBJECT_DB_QUERY_H_
 
+#include <internal/contained.h>
 #include <tuvosharing/base_db.h>
 #include <tuvosharing/condition.h>
 #include <tuvosharing/object_db.h>
 #include <tuvosharing/result.h>
 
 #include <string>
+#include <utility>
 #include <vector>
 
 namespace TUVO::sharing::db {
@@ -27,20 +29,24 @@ class ClearedAfterUse {
 template <typename Record>
 bool ObjectDB::Query(std::vector<Record>& out) const {
   const ClearedAfterUse clear(*condition_);
-  Result result;
-  if (!db_->Execute(std::string("SELECT * FROM ") + table_ + condition_->GetSQL(), result) ||
-      !result.IsGood()) {
-    return false;
-  }
-  out.clear();
-  Row row;
-  while (result.NextRow(row)) {
-    Record record;
-    if (record.FromRow(row)) {
-      out.push_back(record);
+  return Contained([&] {
+    Result result;
+    if (!db_->Execute(std::string("SELECT * FROM ") + table_ + condition_->GetSQL(), result) ||
+        !result.IsGood()) {
+      return false;
     }
-  }
-  return true;
+    // Rows that memory does not suffice for are a failure, not rows that are not there.
+    std::vector<Record> records;
+    Row row;
+    while (result.NextRow(row)) {
+      Record record;
+      if (record.FromRow(row)) {
+        records.push_back(record);
+      }
+    }
+    out = std::move(records);
+    return true;
+  });
 }
 
 }  // namespace TUVO::sharing::db

@@ -21,7 +21,9 @@ class Result;
 //
 // Operations answer true on success. A failed statement leaves its text in GetLastQuery and the
 // reason in GetLastError; other failures write a line to the system log. Nothing is retried.
-// A file that another process has locked is waited for up to 10 seconds.
+// Nothing is thrown but by the constructor, for want of memory; without memory for its texts an
+// operation fails like any other, with the reason in GetLastError, and has run nothing. A file that
+// another process has locked is waited for up to 10 seconds.
 class TUVOSHARING_API BaseDB {
  public:
   // Opens the file at `path`; one that is missing is created with the system identity as its owner
@@ -47,7 +49,7 @@ class TUVOSHARING_API BaseDB {
   bool Commit();
 
   // Inserts a row: NULL for the id, so that the database assigns it, then `values` in column order,
-  // escaped and quoted. `table` is written as it is.
+  // escaped and quoted. `table` is written as it is. A value that cannot be escaped is a failure.
   bool Insert(const std::string& table, const std::vector<std::string>& values);
 
   // Sets the columns named in `fields` (an "id" among them is left out) in row `id`; true also when

@@ -13,8 +13,11 @@ class BaseDB;
 class ConditionPrivate;
 
 // Clauses are joined strictly from left to right without grouping, so AND binds tighter than OR:
-// whoever mixes them writes raw clauses with parentheses of their own. Columns and values are
-// escaped; a raw clause is trusted SQL.
+// whoever mixes them writes raw clauses with parentheses of their own. Values are escaped; columns,
+// sort keys and raw clauses are the program's own, trusted text: a backquote would end a column.
+//
+// Without memory for a clause or a sort key, or for the text, the text is one that no statement
+// runs with, until Clear: a statement without its filter would mean other rows.
 //
 // Bound to the connection that it escapes with, which must outlive it. Not copyable.
 class TUVOSHARING_API Condition {

@@ -73,7 +73,8 @@ class TUVOSHARING_API Entry {
 
   // Loads a row and answers IsLegal(). False as well when the "data" column is no JSON object of
   // the right members' types, or is nested deeper than 100 levels; the plain columns are then
-  // loaded and everything from enable_match_ip on keeps its value.
+  // loaded and everything from enable_match_ip on keeps its value. Lack of memory raises
+  // std::bad_alloc and leaves everything as it was.
   bool FromRow(const db::Row& row);
 
   // The row's id in its table; 0 while it is not stored.

@@ -18,7 +18,7 @@ class EntryDBPrivate;
 
 // Short-lived: construct it for the operations at hand. Its destruction checkpoints the database's
 // write-ahead log, so no Result of the same connection may then be half read. Operations answer
-// true on success.
+// true on success, and throw nothing: lack of memory is a failure.
 class TUVOSHARING_API EntryDB {
  public:
   // `db` must outlive the store.

@@ -19,6 +19,7 @@ class Condition;
 
 // Knows no table's columns: it works through the operations of the record base. Operations answer
 // true on success; a refused record or a failed insert, update or delete writes a line to the log.
+// They throw nothing: lack of memory is a failure.
 class TUVOSHARING_API ObjectDB {
  public:
   ObjectDB(const ObjectDB&) = delete;

@@ -17,8 +17,8 @@ class SharingDBPrivate;
 class TUVOSHARING_API SharingDB : public BaseDB {
  public:
   // The process's one instance on SZF_SHARING_DB_PATH, opened on the first call and closed when the
-  // process ends. Never fails as a call, but the instance may not be good, and then stays so: ask
-  // IsGood.
+  // process ends. The instance may not be good, and then stays so: ask IsGood. Fails as a call,
+  // with std::bad_alloc, only for want of memory; the next call then tries again.
   static SharingDB& Instance();
 
   // Open SZF_SHARING_DB_PATH, or another file, created with mode 0660 when missing. Failures are

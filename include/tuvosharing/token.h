@@ -48,7 +48,8 @@ class TUVOSHARING_API Token {
   // Precondition: `value` is null or an object.
   void ToJSON(Json::Value& value) const;
 
-  // Loads a row and answers IsLegal().
+  // Loads a row and answers IsLegal(). Lack of memory raises std::bad_alloc and leaves everything
+  // as it was.
   bool FromRow(const db::Row& row);
 
   // The row's id in its table; 0 while it is not stored.

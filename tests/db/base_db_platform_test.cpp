@@ -521,6 +521,25 @@ TEST_F(BaseDBPlatform, WithoutMemoryForALongTextEscapingFailsAndAsksThePlatformF
                   ") escape failed\n\n"});
 }
 
+// The empty text in its place would be a row without its data.
+TEST_F(BaseDBPlatform, WhatCannotBeEscapedIsNotStored) {
+  Open();
+  ASSERT_TRUE(db_->Execute("CREATE TABLE t (id INTEGER PRIMARY KEY, value TEXT)"));
+  ASSERT_TRUE(db_->Insert("t", {"before"}));
+  const std::string query = db_->GetLastQuery();
+  calls.clear();
+  const std::string text(40000, 'x');
+  no_memory = true;
+  EXPECT_FALSE(db_->Insert("t", {text}));
+  EXPECT_FALSE(db_->Update("t", {{"value", text}}, 1));
+  EXPECT_FALSE(db_->Update("t", {{text, "value"}}, 1));
+  no_memory = false;
+  EXPECT_EQ(calls, Lines{"TUVODBEscapeStringEX2(null,10,value,5) as 0:0"}) << "a column's name";
+  EXPECT_EQ(db_->GetLastError(), "escape failed");
+  EXPECT_EQ(db_->GetLastQuery(), query);
+  EXPECT_EQ(tuvo_test::TakeWritten(listener_).size(), 3U);
+}
+
 // --- A file of root ---------------------------------------------------------------------------
 
 TEST_F(BaseDBPlatform, TheOwnerIsAskedForUnderTheCallersIdentity) {

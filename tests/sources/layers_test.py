@@ -17,14 +17,14 @@ LAYERS = {
     "platform": ("platform/*", []),
     "common": (
         "utils/* include/tuvosharing/{export,keys,utils,user_group,sharing_url,send_webapi}.h "
-        "include/internal/{log,json_text,time_text,user_id,popen}.h",
+        "include/internal/{contained,log,json_text,time_text,user_id,popen}.h",
         ["platform"],
     ),
     "rows": ("db/{field,row,result}.cpp include/tuvosharing/{field,row,result}.h",
              ["platform", "common"]),
     "connection": (
         "db/{base_db,condition,run_as}.cpp include/tuvosharing/{base_db,condition}.h "
-        "include/internal/{base_db_private,condition_private,run_as}.h",
+        "include/internal/{base_db_private,condition_private,escaped,run_as}.h",
         ["platform", "common", "rows"],
     ),
     "record": (
