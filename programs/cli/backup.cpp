@@ -1,6 +1,7 @@
 // tuvosharing backup
 #include <fcntl.h>
 #include <sys/stat.h>
+#include <sys/statvfs.h>
 #include <tuvoplatform/database.h>
 #include <tuvosharing/keys.h>
 #include <unistd.h>
@@ -53,12 +54,41 @@ class CopyPlace {
   std::string folder_;
 };
 
+// What a backup leaves free beside the database for those who go on writing to it, and the rest
+// of that below which it gives up: to have no backup is better than to have no room for links.
+constexpr std::uintmax_t kLeftForOthers = std::uintmax_t{16} << 20;
+constexpr std::uintmax_t kLeast = kLeftForOthers / 2;
+
+std::uintmax_t SizeOf(const std::string& path) {
+  struct stat st {};
+  return stat(path.c_str(), &st) == 0 ? static_cast<std::uintmax_t>(st.st_size) : 0;
+}
+
+bool HasRoom(const std::string& folder, std::uintmax_t bytes) {
+  struct statvfs room {};
+  return statvfs(folder.c_str(), &room) == 0 &&
+         static_cast<std::uintmax_t>(room.f_bavail) * room.f_frsize >= bytes;
+}
+
+void RequireRoom(const std::string& folder, std::uintmax_t bytes) {
+  if (!HasRoom(folder, bytes)) {
+    throw Failure(ExitStatus::kFailed,
+                  folder + ": has too little room for a copy beside the database");
+  }
+}
+
+// What is told while pages are copied.
+struct Copying {
+  Progress progress{"pages copied", 0};
+  std::string folder;
+};
+
 // Another answer than 0 ends the copying.
 int ShowProgress(void* context, unsigned int left, unsigned int total) {
-  auto* progress = static_cast<Progress*>(context);
-  progress->SetTotal(total);
-  progress->Show(total - left);
-  return NotedSignal();
+  auto* copying = static_cast<Copying*>(context);
+  copying->progress.SetTotal(total);
+  copying->progress.Show(total - left);
+  return NotedSignal() != 0 || !HasRoom(copying->folder, kLeast) ? 1 : 0;
 }
 
 void CopyDatabase(const std::string& from, const std::string& to) {
@@ -67,9 +97,13 @@ void CopyDatabase(const std::string& from, const std::string& to) {
     throw SystemFailure("the database cannot be read");
   }
   const Db db(TUVODBConnect("", "", "", from.c_str()));
-  Progress progress("pages copied", 0);
-  if (!db || TUVODBBackup(db.get(), to.c_str(), ShowProgress, &progress) != 0) {
+  Copying copying;
+  copying.folder = FolderOf(from);
+  // The write-ahead log may hold as many pages that are not yet in the file.
+  RequireRoom(copying.folder, SizeOf(from) + SizeOf(from + "-wal") + kLeftForOthers);
+  if (!db || TUVODBBackup(db.get(), to.c_str(), ShowProgress, &copying) != 0) {
     StopIfInterrupted();
+    RequireRoom(copying.folder, kLeast);
     throw Failure(ExitStatus::kFailed,
                   std::string("the database cannot be copied: ") + TUVODBErrorGet(db.get()));
   }
@@ -85,6 +119,7 @@ void HandOver(const std::string& copy, int to) {
   Progress progress("bytes written", st.st_size);
   for (std::int64_t done = 0; done < st.st_size; done += kPiece) {
     StopIfInterrupted();
+    RequireRoom(FolderOf(copy), kLeast);
     progress.Show(done);
     if (!common::CopyAll(from.get(), done, std::min(kPiece, st.st_size - done), to)) {
       throw SystemFailure("the copy cannot be written");

@@ -4,6 +4,7 @@
 #include <CLI/Config.hpp>
 #include <CLI/Formatter.hpp>
 #include <algorithm>
+#include <charconv>
 #include <iostream>
 #include <memory>
 
@@ -61,8 +62,16 @@ void AddText(CLI::App* command, const std::string& name, std::string* text, cons
   command->add_option(name, Keep(take), help)->type_name(value);
 }
 
+// Decimal digits, as everywhere: 010 is ten.
 void AddNumber(CLI::App* command, const char* name, int* number, const char* help) {
-  command->add_option(name, *number, help)->type_name("N");
+  const auto take = [name, number](const std::string& text) {
+    const char* end = text.data() + text.size();
+    const auto [stop, error] = std::from_chars(text.data(), end, *number);
+    if (error != std::errc() || stop != end) {
+      throw Failure(ExitStatus::kUsage, std::string(name) + ": must be a whole number");
+    }
+  };
+  command->add_option(name, Keep(take), help)->type_name("N");
 }
 
 void AddLinks(CLI::App* command, NamedLinks* links) {
@@ -222,6 +231,14 @@ void AddVisitors(Builder builder) {
   AddJson(command, &tokens->json);
 }
 
+void AddSignOut(Builder builder) {
+  auto options = std::make_shared<SignOutOptions>();
+  CLI::App* command =
+      builder.Add("signout", "End the admission of everybody who is in", SignOut, options);
+  AddLinks(command, &options->links);
+  AddJson(command, &options->json);
+}
+
 void AddPurge(Builder builder) {
   auto options = std::make_shared<PurgeOptions>();
   CLI::App* command =
@@ -275,6 +292,7 @@ void AddCommands(CLI::App* app, Action* action) {
   AddDelete(builder);
   AddPurge(builder);
   AddVisitors(builder);
+  AddSignOut(builder);
   AddTransfer(builder);
   AddUpkeep(builder);
 }

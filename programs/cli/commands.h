@@ -71,6 +71,13 @@ struct VisitorOptions {
 ExitStatus Sessions(const VisitorOptions& options);
 ExitStatus Tokens(const VisitorOptions& options);
 
+struct SignOutOptions {
+  NamedLinks links;
+  bool json = false;
+};
+// Of several links those that are there are signed out; the first problem decides the status.
+ExitStatus SignOut(const SignOutOptions& options);
+
 struct PurgeOptions {
   std::string owner;
   std::string project;

@@ -24,8 +24,15 @@ using TUVO::sharing::record::Entry;
 owner::MaybeProblem MakeLink(const GivenSettings& given, std::time_t now, Entry* link) {
   link->set_owner_uid(getuid());
   link->set_app(Json::Value(Json::objectValue));
+  if (owner::MaybeProblem problem = ApplyGivenSettings(given, link)) {
+    return problem;
+  }
+  owner::FileLook look;
   if (owner::MaybeProblem problem =
-          ApplyGivenSettings(given, common::ReadConfig().share_folders, link)) {
+          LookAtGivenFile(given, common::ReadConfig().share_folders, *link, &look)) {
+    return problem;
+  }
+  if (owner::MaybeProblem problem = owner::UseLook(look, link)) {
     return problem;
   }
   if (link->get_expire_at() != 0 && link->get_expire_at() <= now) {
@@ -35,7 +42,7 @@ owner::MaybeProblem MakeLink(const GivenSettings& given, std::time_t now, Entry*
   return owner::CreateLink(Database(), link);
 }
 
-void Print(const Entry& link, const CreateOptions& options, std::time_t now) {
+void PrintLink(const Entry& link, const CreateOptions& options, std::time_t now) {
   if (options.quiet) {
     std::cout << link.get_hash() << '\n';
     return;
@@ -53,9 +60,22 @@ void Print(const Entry& link, const CreateOptions& options, std::time_t now) {
   }
 }
 
-}  // namespace
+// Whoever is not told its hash has a link that is live all the same.
+void Print(const Entry& link, const CreateOptions& options, std::time_t now) {
+  PrintLink(link, options, now);
+  if (std::cout.flush()) {
+    return;
+  }
+  const Failure failure(ExitStatus::kFailed, "the link is made (#" + std::to_string(link.get_id()) +
+                                                 "); its hash cannot be written");
+  if (NotedSignal() != 0) {
+    Complain(failure.what());
+    throw Interruption();
+  }
+  throw failure;
+}
 
-ExitStatus Create(const CreateOptions& options) {
+ExitStatus MakeAndPrint(const CreateOptions& options) {
   const std::time_t now = std::time(nullptr);
   const GivenSettings given =
       ReadGivenSettings(options.settings, TUVO::sharing::SZK_PROJECT_NAME, now);
@@ -68,6 +88,12 @@ ExitStatus Create(const CreateOptions& options) {
   Require(problem);
   Print(link, options, now);
   return ExitStatus::kDone;
+}
+
+}  // namespace
+
+ExitStatus Create(const CreateOptions& options) {
+  return LogRefusal("create", [&options] { return MakeAndPrint(options); });
 }
 
 }  // namespace cli

@@ -64,7 +64,7 @@ void AskFirst(const std::string& question) {
   const bool confirmed = Confirm(question);
   StopIfInterrupted();
   if (!confirmed) {
-    throw Failure(ExitStatus::kFailed, "nothing was deleted");
+    throw Declined("nothing was deleted");
   }
 }
 
@@ -135,7 +135,9 @@ ExitStatus DeleteDamaged(const DeleteOptions& options) {
 }  // namespace
 
 ExitStatus Delete(const DeleteOptions& options) {
-  return options.damaged ? DeleteDamaged(options) : DeleteLinks(options);
+  return LogRefusal("delete", [&options] {
+    return options.damaged ? DeleteDamaged(options) : DeleteLinks(options);
+  });
 }
 
 }  // namespace cli

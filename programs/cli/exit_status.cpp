@@ -21,4 +21,21 @@ ExitStatus StatusOf(owner::Error error) {
   }
 }
 
+owner::Error UsualErrorOf(ExitStatus status) {
+  switch (status) {
+    case ExitStatus::kUsage:
+      return owner::Error::kBadValue;
+    case ExitStatus::kNoSuchLink:
+      return owner::Error::kNoSuchLink;
+    case ExitStatus::kTaken:
+      return owner::Error::kHashTaken;
+    case ExitStatus::kNotAllowed:
+      return owner::Error::kForbidden;
+    case ExitStatus::kBusy:
+      return owner::Error::kBusy;
+    default:
+      return owner::Error::kInternal;
+  }
+}
+
 }  // namespace cli

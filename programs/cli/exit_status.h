@@ -19,6 +19,9 @@ enum class ExitStatus : int {
 
 ExitStatus StatusOf(owner::Error error);
 
+// The code of what ends with that status when nothing says it more exactly.
+owner::Error UsualErrorOf(ExitStatus status);
+
 }  // namespace cli
 
 #endif  // PROGRAMS_CLI_EXIT_STATUS_H_

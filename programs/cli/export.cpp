@@ -16,7 +16,7 @@
 #include "cli/output.h"
 #include "cli/progress.h"
 #include "cli/row_id.h"
-#include "common/stream.h"
+#include "cli/standard_output.h"
 #include "owner/link_list.h"
 
 namespace cli {
@@ -43,7 +43,7 @@ class ReadTransaction {
 };
 
 void Write(int fd, const std::string& text) {
-  if (!common::WriteAll(fd, text)) {
+  if (!WriteOutput(fd, text)) {
     throw SystemFailure("cannot write the links");
   }
 }

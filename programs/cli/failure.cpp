@@ -12,7 +12,7 @@ Failure FailureOf(const owner::Problem& problem, const std::string& subject) {
   if (!problem.field.empty()) {
     text += OptionOf(problem.field) + ": ";
   }
-  return {StatusOf(problem.error), text + problem.message};
+  return {StatusOf(problem.error), text + problem.message, problem.error};
 }
 
 Failure SystemFailure(const std::string& what) {

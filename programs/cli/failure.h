@@ -13,12 +13,24 @@ namespace cli {
 // Ends the command: its text is shown in one line, its status is the program's.
 class Failure : public std::runtime_error {
  public:
-  Failure(ExitStatus status, const std::string& text) : std::runtime_error(text), status_(status) {}
+  Failure(ExitStatus status, const std::string& text)
+      : Failure(status, text, UsualErrorOf(status)) {}
+  Failure(ExitStatus status, const std::string& text, owner::Error error)
+      : std::runtime_error(text), status_(status), error_(error) {}
 
   ExitStatus status() const { return status_; }
+  // What the system log is told.
+  owner::Error error() const { return error_; }
 
  private:
   ExitStatus status_;
+  owner::Error error_;
+};
+
+// Somebody who was asked said no.
+class Declined : public Failure {
+ public:
+  explicit Declined(const std::string& text) : Failure(ExitStatus::kFailed, text) {}
 };
 
 // The problem in the words of the command line: its field as the option that sets it. `subject`,

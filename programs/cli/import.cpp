@@ -182,9 +182,7 @@ void Print(const Counts& counts, const ImportOptions& options) {
             << (options.dry_run ? " " : "ped ") << counts.skipped << '\n';
 }
 
-}  // namespace
-
-ExitStatus Import(const ImportOptions& options) {
+ExitStatus ImportOrTry(const ImportOptions& options) {
   const OnConflict on_conflict = OnConflictOf(options.on_conflict);
   const std::vector<LinkRow> rows = RowsOf(options.file);
   CheckUnique(rows);
@@ -196,6 +194,15 @@ ExitStatus Import(const ImportOptions& options) {
   Require(problem);
   Print(counts, options);
   return ExitStatus::kDone;
+}
+
+}  // namespace
+
+ExitStatus Import(const ImportOptions& options) {
+  if (options.dry_run) {
+    return ImportOrTry(options);
+  }
+  return LogRefusal("import", [&options] { return ImportOrTry(options); });
 }
 
 }  // namespace cli

@@ -58,6 +58,7 @@ void NoteSignal(int signal) {
 }  // namespace
 
 void NoteSignals() {
+  (void)std::signal(SIGXFSZ, SIG_IGN);
   for (const int signal : kSignals) {
     NoteSignal(signal);
   }
@@ -79,6 +80,17 @@ void WaitForInput(int fd) {
   pollfd input{fd, POLLIN, 0};
   (void)ppoll(&input, 1, nullptr, held.Former());
   StopIfInterrupted();
+}
+
+void WaitForOutput(int fd) {
+  constexpr timespec kNoTime{};
+  const Held held;
+  pollfd output{fd, POLLOUT, 0};
+  // After a signal nothing is waited for, but what can be said is.
+  const timespec* most = noted != 0 ? &kNoTime : nullptr;
+  if (ppoll(&output, 1, most, held.Former()) < 1) {
+    StopIfInterrupted();
+  }
 }
 
 void EndBySignal(int signal) {

@@ -4,6 +4,7 @@
 
 #include "cli/failure.h"
 #include "cli/line_reader.h"
+#include "cli/progress.h"
 #include "owner/argument.h"
 
 namespace cli {
@@ -86,7 +87,9 @@ std::vector<LinkRow> ReadLinkFile(int fd) {
   LineReader reader(fd, kLongestLine);
   CheckFirstLine(&reader);
   std::vector<LinkRow> rows;
+  Progress progress("read", 0);
   for (;;) {
+    progress.Show(static_cast<long long>(rows.size()));
     const Json::Value json = NextLine(&reader, rows.size());
     if (IsLastLine(json)) {
       CheckLastLine(json, rows.size(), &reader);

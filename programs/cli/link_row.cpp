@@ -6,6 +6,7 @@
 #include <charconv>
 #include <cstdint>
 #include <map>
+#include <new>
 #include <string_view>
 
 #include "owner/text_check.h"
@@ -125,6 +126,16 @@ std::string OwnerName(const LinkRow& row) {
   return found != known.end() ? found->second : known.emplace(uid, NameOf(uid)).first->second;
 }
 
+// Escape can only answer the empty text when memory does not suffice; a link is not stored without
+// its data.
+std::string EscapedColumn(const BaseDB& db, const std::string& column) {
+  std::string escaped = db.Escape(column);
+  if (escaped.empty() && !column.empty()) {
+    throw std::bad_alloc();
+  }
+  return escaped;
+}
+
 }  // namespace
 
 const std::array<const char*, kLinkColumnCount>& LinkColumns() {
@@ -202,7 +213,7 @@ std::optional<LinkRow> LinkRowOf(const Json::Value& json) {
 std::string InsertStatement(const BaseDB& db, const LinkRow& row) {
   std::string sql = "INSERT INTO entry VALUES (NULL";
   for (const std::optional<std::string>& column : row.columns) {
-    sql += column ? ", '" + db.Escape(*column) + "'" : ", NULL";
+    sql += column ? ", '" + EscapedColumn(db, *column) + "'" : ", NULL";
   }
   return sql + ")";
 }

@@ -9,7 +9,11 @@
 #include "cli/failure.h"
 #include "cli/interrupt.h"
 #include "cli/output.h"
+#include "cli/secrecy.h"
+#include "cli/standard_output.h"
+#include "common/core_dump.h"
 #include "common/privileges.h"
+#include "common/process_start.h"
 
 namespace {
 
@@ -31,12 +35,14 @@ void TakeIdentity() {
   if (!common::DropPrivileges()) {
     throw cli::Failure(cli::ExitStatus::kFailed, "root could not be given up");
   }
+  common::ForbidCore();  // behind the change of ids, with which the system decides anew
 }
 
 // Nothing more is said where nobody reads.
 cli::ExitStatus AfterOutput(cli::ExitStatus status) {
   std::cout.flush();
   if (!std::cout) {
+    cli::StopIfInterrupted();
     throw cli::Failure(cli::ExitStatus::kFailed, "the output cannot be written");
   }
   return status;
@@ -44,6 +50,7 @@ cli::ExitStatus AfterOutput(cli::ExitStatus status) {
 
 cli::ExitStatus Run(int argc, char** argv) {
   const std::function<cli::ExitStatus()> command = cli::ReadCommandLine(argc, argv);
+  cli::WipeArguments(argc, argv);
   if (!command) {
     return AfterOutput(cli::ExitStatus::kDone);
   }
@@ -55,7 +62,11 @@ cli::ExitStatus Run(int argc, char** argv) {
 }  // namespace
 
 int main(int argc, char** argv) {
+  if (!common::StartProcess()) {
+    return static_cast<int>(cli::ExitStatus::kFailed);
+  }
   std::ios::sync_with_stdio(false);
+  const cli::StandardOutput output;
   // For the widths of characters; the texts are UTF-8 wherever the program is started.
   (void)std::setlocale(LC_CTYPE, "C.UTF-8");
   try {

@@ -164,9 +164,7 @@ void Print(const Counts& counts, const PurgeOptions& options) {
   std::cout << '\n';
 }
 
-}  // namespace
-
-ExitStatus Purge(const PurgeOptions& options) {
+ExitStatus PurgeOrCount(const PurgeOptions& options) {
   BaseDB& db = Database();
   const std::time_t now = std::time(nullptr);
   (void)EndedLinks(db, options, now);  // an owner who is none is told before anything is done
@@ -178,6 +176,15 @@ ExitStatus Purge(const PurgeOptions& options) {
   DeleteAndLog(db, options, now, &counts);
   Print(counts, options);
   return ExitStatus::kDone;
+}
+
+}  // namespace
+
+ExitStatus Purge(const PurgeOptions& options) {
+  if (options.dry_run) {
+    return PurgeOrCount(options);
+  }
+  return LogRefusal("delete_expired", [&options] { return PurgeOrCount(options); });
 }
 
 }  // namespace cli

@@ -10,7 +10,6 @@
 #include "cli/failure.h"
 #include "cli/line_reader.h"
 #include "cli/terminal.h"
-#include "owner/file_link.h"
 
 namespace cli {
 
@@ -203,8 +202,7 @@ GivenSettings ReadGivenSettings(const SettingOptions& options, const std::string
   return given;
 }
 
-owner::MaybeProblem ApplyGivenSettings(const GivenSettings& given,
-                                       const std::vector<std::string>& share_folders, Entry* link) {
+owner::MaybeProblem ApplyGivenSettings(const GivenSettings& given, Entry* link) {
   owner::Settings settings = given.settings;
   if (given.path) {
     if (owner::MaybeProblem problem = SetPath(*given.path, *link, &settings)) {
@@ -214,13 +212,17 @@ owner::MaybeProblem ApplyGivenSettings(const GivenSettings& given,
   if (given.no_password) {
     RemovePassword(link);
   }
-  if (owner::MaybeProblem problem = owner::ApplySettings(settings, link)) {
-    return problem;
-  }
-  if (!owner::TouchesFile(settings)) {
-    return std::nullopt;
-  }
-  owner::MaybeProblem problem = owner::CheckFileLink(share_folders, link, kByAdministrator);
+  return owner::ApplySettings(settings, link);
+}
+
+bool TouchesFile(const GivenSettings& given) {
+  return given.path || owner::TouchesFile(given.settings);
+}
+
+owner::MaybeProblem LookAtGivenFile(const GivenSettings& given,
+                                    const std::vector<std::string>& share_folders,
+                                    const Entry& link, owner::FileLook* look) {
+  owner::MaybeProblem problem = owner::LookAtFile(share_folders, link, kByAdministrator, look);
   if (problem && given.path_was_given && problem->field == SZK_APP) {
     problem->field = kPathMember;
   }

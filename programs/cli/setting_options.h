@@ -10,6 +10,7 @@
 #include <string>
 #include <vector>
 
+#include "owner/file_link.h"
 #include "owner/settings.h"
 
 namespace cli {
@@ -71,11 +72,20 @@ struct GivenSettings {
 GivenSettings ReadGivenSettings(const SettingOptions& options, const std::string& needed,
                                 std::time_t now);
 
-// Makes the link what was given, and sees that the whole fits together; file links are looked at
-// below `share_folders`. May be called again, with another link.
+// Makes the link what was given, and sees that the whole fits together. Does not look at files. May
+// be called again, with another link.
 owner::MaybeProblem ApplyGivenSettings(const GivenSettings& given,
-                                       const std::vector<std::string>& share_folders,
                                        TUVO::sharing::record::Entry* link);
+
+// Whether a file link that becomes what was given is to be looked at.
+bool TouchesFile(const GivenSettings& given);
+
+// Looks, below `share_folders`, at the file of a link that has become what was given (file_link.h:
+// not while the database is locked).
+owner::MaybeProblem LookAtGivenFile(const GivenSettings& given,
+                                    const std::vector<std::string>& share_folders,
+                                    const TUVO::sharing::record::Entry& link,
+                                    owner::FileLook* look);
 
 }  // namespace cli
 

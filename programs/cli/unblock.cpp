@@ -16,12 +16,9 @@ bool IsAddress(const std::string& text) {
          inet_pton(AF_INET6, text.c_str(), &address) == 1;
 }
 
-}  // namespace
-
-ExitStatus Unblock(const UnblockOptions& options) {
+ExitStatus UnblockAll(const UnblockOptions& options) {
   for (const std::string& address : options.addresses) {
     if (!IsAddress(address)) {
-      LogChange("unblock", 0, owner::Fault(owner::Error::kBadValue, "is no address"));
       throw Failure(ExitStatus::kUsage, address + ": is no address");
     }
   }
@@ -34,6 +31,12 @@ ExitStatus Unblock(const UnblockOptions& options) {
     }
   }
   return ExitStatus::kDone;
+}
+
+}  // namespace
+
+ExitStatus Unblock(const UnblockOptions& options) {
+  return LogRefusal("unblock", [&options] { return UnblockAll(options); });
 }
 
 }  // namespace cli

@@ -14,9 +14,11 @@
 #include <utility>
 
 #include "common/cgi_exchange.h"
+#include "common/core_dump.h"
 #include "common/environment.h"
 #include "common/fastcgi_exchange.h"
 #include "common/privileges.h"
+#include "common/process_start.h"
 #include "common/stop_signal.h"
 
 namespace common {
@@ -102,7 +104,11 @@ int ServeFastCgi(const Program& program, bool able) {
 }  // namespace
 
 int RunGateway(const Program& program) {
+  if (!StartProcess()) {
+    return EXIT_FAILURE;
+  }
   const bool able = DropPrivileges();
+  ForbidCore();
   (void)std::signal(SIGPIPE, SIG_IGN);
   // Out of sight before the protocol's library, asked anything, looks for settings of its own.
   char** const variables = std::exchange(environ, nullptr);

@@ -23,12 +23,13 @@ struct Program {
   bool (*is_fit)();
 };
 
-// Gives up privileges (privileges.h), and serves the one request of a CGI program or, when standard
-// input is a listening socket, one FastCGI request after another; nothing is left of one when the
-// next begins. Returns the process's exit status: 0 when all was well, as after a SIGTERM, which
-// ends a FastCGI program as soon as no request is being served, and after many requests.
-// A FastCGI socket must be a local one: over the network anybody on this machine could pose as the
-// web server, whose word for a client's address and account is taken.
+// Puts in order what was inherited (process_start.h), gives up privileges (privileges.h), and
+// serves the one request of a CGI program or, when standard input is a listening socket, one
+// FastCGI request after another; nothing is left of one when the next begins. Returns the process's
+// exit status: 0 when all was well, as after a SIGTERM, which ends a FastCGI program as soon as no
+// request is being served, and after many requests. A FastCGI socket must be a local one: over the
+// network anybody on this machine could pose as the web server, whose word for a client's address
+// and account is taken.
 int RunGateway(const Program& program);
 
 }  // namespace common

@@ -8,6 +8,7 @@
 #include <cstdint>
 #include <limits>
 #include <memory>
+#include <sstream>
 #include <string_view>
 
 #include "owner/text_check.h"
@@ -216,7 +217,12 @@ std::string WriteJson(const Json::Value& value) {
   Json::StreamWriterBuilder builder;
   builder["indentation"] = "";
   builder["emitUTF8"] = true;
-  return Json::writeString(builder, value);
+  const std::unique_ptr<Json::StreamWriter> writer(builder.newStreamWriter());
+  std::ostringstream text;
+  // Or memory that runs out in the middle would leave the rest away without a word.
+  text.exceptions(std::ios_base::badbit);
+  writer->write(value, &text);
+  return text.str();
 }
 
 }  // namespace owner

@@ -6,6 +6,10 @@
 #include <tuvosharing/result.h>
 #include <tuvosharing/row.h>
 
+#include <algorithm>
+
+#include "owner/database_log.h"
+
 namespace owner {
 
 namespace {
@@ -37,6 +41,61 @@ std::string SearchClause(const BaseDB& db, const std::string& piece) {
          ")";
 }
 
+// As many as may be in memory together, each with all of its data.
+constexpr size_t kRowsAtATime = 16;
+
+void AddOrder(const ListRequest& request, Condition* condition) {
+  condition->OrderBy(request.sort, !request.descending);
+  if (request.sort != TUVO::sharing::SZK_ID_) {
+    condition->OrderBy(TUVO::sharing::SZK_ID_, !request.descending);
+  }
+}
+
+// Of the whole page, in its order.
+bool ReadIds(BaseDB& db, const ListRequest& request, std::time_t now,
+             std::vector<std::string>* ids) {
+  Condition page(db);
+  AddFilters(db, request, now, &page);
+  AddOrder(request, &page);
+  page.Limit(request.offset, request.limit);
+  Result rows;
+  if (!db.Execute("SELECT id FROM entry" + page.GetSQL(), rows)) {
+    return false;
+  }
+  for (Row row; rows.NextRow(row);) {
+    ids->push_back(row.GetField(TUVO::sharing::SZK_ID_).AsString(""));
+  }
+  return true;
+}
+
+// Some of them, from `first` on, as a list in a statement has them.
+std::string PieceOf(const std::vector<std::string>& ids, size_t first) {
+  std::string piece = ids[first];
+  for (size_t i = first + 1; i < std::min(first + kRowsAtATime, ids.size()); ++i) {
+    piece += "," + ids[i];
+  }
+  return piece;
+}
+
+// `more` becomes false when `take` wants no further link.
+bool TakePiece(BaseDB& db, const ListRequest& request, const std::string& ids,
+               const std::function<bool(const Entry&)>& take, bool* more) {
+  Condition piece(db);
+  piece.Where("id IN (" + ids + ")");
+  AddOrder(request, &piece);
+  Result rows;
+  if (!db.Execute("SELECT * FROM entry" + piece.GetSQL(), rows)) {
+    return false;
+  }
+  for (Row row; *more && rows.NextRow(row);) {
+    Entry link;
+    if (link.FromRow(row)) {
+      *more = take(link);
+    }
+  }
+  return true;
+}
+
 }  // namespace
 
 void AddFilters(const BaseDB& db, const ListRequest& request, std::time_t now,
@@ -64,27 +123,19 @@ const std::vector<std::string>& SortColumns() {
 }
 
 MaybeProblem ForEachLink(BaseDB& db, const ListRequest& request, std::time_t now,
-                         const std::function<void(const Entry&)>& take, int* total) {
+                         const std::function<bool(const Entry&)>& take, int* total) {
   const EntryDB store(db);
   AddFilters(db, request, now, &store.GetCondition());
-  if (!store.Count(*total)) {
+  std::vector<std::string> ids;
+  if (!store.Count(*total) || !ReadIds(db, request, now, &ids)) {
+    LogDatabaseFault(db.GetLastError());
     return InternalFault();
   }
-  Condition condition(db);
-  AddFilters(db, request, now, &condition);
-  condition.OrderBy(request.sort, !request.descending);
-  if (request.sort != TUVO::sharing::SZK_ID_) {
-    condition.OrderBy(TUVO::sharing::SZK_ID_, !request.descending);
-  }
-  condition.Limit(request.offset, request.limit);
-  Result rows;
-  if (!db.Execute("SELECT * FROM entry" + condition.GetSQL(), rows)) {
-    return InternalFault();
-  }
-  for (Row row; rows.NextRow(row);) {
-    Entry link;
-    if (link.FromRow(row)) {
-      take(link);
+  bool more = true;
+  for (size_t first = 0; more && first < ids.size(); first += kRowsAtATime) {
+    if (!TakePiece(db, request, PieceOf(ids, first), take, &more)) {
+      LogDatabaseFault(db.GetLastError());
+      return InternalFault();
     }
   }
   return std::nullopt;
@@ -93,7 +144,12 @@ MaybeProblem ForEachLink(BaseDB& db, const ListRequest& request, std::time_t now
 MaybeProblem ListLinks(BaseDB& db, const ListRequest& request, std::time_t now,
                        std::vector<Entry>* links, int* total) {
   return ForEachLink(
-      db, request, now, [links](const Entry& link) { links->push_back(link); }, total);
+      db, request, now,
+      [links](const Entry& link) {
+        links->push_back(link);
+        return true;
+      },
+      total);
 }
 
 }  // namespace owner

@@ -40,10 +40,11 @@ void AddFilters(const TUVO::sharing::db::BaseDB& db, const ListRequest& request,
 MaybeProblem ListLinks(TUVO::sharing::db::BaseDB& db, const ListRequest& request, std::time_t now,
                        std::vector<TUVO::sharing::record::Entry>* links, int* total);
 
-// Calls `take` for each link of the page in turn, and keeps none of them: a link with its data may
-// be large, and a page has many.
+// Calls `take` for each link of the page in turn, until it returns false, and holds few of them at
+// a time: a link with its data may be large, and a page has many. One that is gone before its turn
+// is left out.
 MaybeProblem ForEachLink(TUVO::sharing::db::BaseDB& db, const ListRequest& request, std::time_t now,
-                         const std::function<void(const TUVO::sharing::record::Entry&)>& take,
+                         const std::function<bool(const TUVO::sharing::record::Entry&)>& take,
                          int* total);
 
 }  // namespace owner

@@ -1,6 +1,7 @@
 #include "owner/link_state.h"
 
 #include <array>
+#include <limits>
 #include <utility>
 
 namespace owner {
@@ -16,22 +17,41 @@ constexpr std::array<std::pair<LinkState, const char*>, 5> kTexts = {
      {LinkState::kNotYet, "not_yet"},
      {LinkState::kLive, "live"}}};
 
-// As the records read it: a row without a value counts as enabled.
-constexpr const char* kEnabled = "(enabled IS NULL OR enabled = '' OR enabled = 1)";
+// As the records read it: a row without a value counts as enabled. The text is that which the
+// platform hands them, up to a zero byte.
+constexpr const char* kEnabled = "(printf('%s', enabled) IN ('', '1'))";
+
+// The number that the records read from a column of that type, whatever another program has put
+// there: a text's leading digits, and 0 for one without, for NULL and for a number that does not
+// fit. To SQL itself every text is greater than every number: a count that is the empty text would
+// have used up any limit. (A conversion that does not fit 64 bits ends at their limits.)
+template <typename T>
+std::string NumberIn(const std::string& column) {
+  const std::string fits = " BETWEEN " + std::to_string(std::numeric_limits<T>::min()) + " AND " +
+                           std::to_string(std::numeric_limits<T>::max());
+  const std::string read = "CAST(printf('%s', " + column + ") AS INTEGER)";
+  const std::string plain = "typeof(" + column + ") = 'integer'";
+  return "(CASE WHEN " + plain + " AND " + column + fits + " THEN " + column + " WHEN " + plain +
+         " OR " + read + " IN (-9223372036854775808, 9223372036854775807) THEN 0 WHEN " + read +
+         fits + " THEN " + read + " ELSE 0 END)";
+}
 
 std::string Past(const std::string& now) {
-  return "(expire_at > 0 AND expire_at < " + now + ")";
+  const std::string end = NumberIn<long>("expire_at");
+  return "(" + end + " > 0 AND " + end + " < " + now + ")";
 }
 
 std::string Future(const std::string& now) {
-  return "(start_at > 0 AND start_at > " + now + ")";
+  return "(" + NumberIn<long>("start_at") + " > " + now + ")";
 }
 
-constexpr const char* kUsedUpClause = "(expire_times > 0 AND use_count >= expire_times)";
+std::string UsedUp() {
+  const std::string limit = NumberIn<int>("expire_times");
+  return "(" + limit + " > 0 AND " + NumberIn<int>("use_count") + " >= " + limit + ")";
+}
 
-// A comparison with NULL is neither true nor false: such a row is of the state without it.
 std::string Not(const std::string& clause) {
-  return "IFNULL(NOT " + clause + ", 1)";
+  return "(NOT " + clause + ")";
 }
 
 }  // namespace
@@ -72,22 +92,22 @@ std::string StateClause(LinkState state, std::time_t now) {
   const std::string moment = std::to_string(now);
   std::string clause = std::string("(") + kEnabled;
   if (state == LinkState::kDisabled) {
-    return "(NOT " + std::string(kEnabled) + ")";
+    return Not(kEnabled);
   }
   if (state == LinkState::kExpired) {
     return clause + " AND " + Past(moment) + ")";
   }
   clause += " AND " + Not(Past(moment));
   if (state == LinkState::kUsedUp) {
-    return clause + " AND " + kUsedUpClause + ")";
+    return clause + " AND " + UsedUp() + ")";
   }
-  clause += " AND " + Not(kUsedUpClause);
+  clause += " AND " + Not(UsedUp());
   return clause + " AND " + (state == LinkState::kNotYet ? Future(moment) : Not(Future(moment))) +
          ")";
 }
 
 std::string EndedClause(std::time_t now) {
-  return "(" + Past(std::to_string(now)) + " OR " + kUsedUpClause + ")";
+  return "(" + Past(std::to_string(now)) + " OR " + UsedUp() + ")";
 }
 
 }  // namespace owner

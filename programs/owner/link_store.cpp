@@ -5,9 +5,11 @@
 #include <tuvosharing/keys.h>
 #include <tuvosharing/result.h>
 #include <tuvosharing/row.h>
+#include <tuvosharing/token_db.h>
 
 #include <ctime>
 
+#include "owner/database_log.h"
 #include "owner/link_state.h"
 #include "owner/transaction.h"
 
@@ -20,6 +22,7 @@ using TUVO::sharing::db::Condition;
 using TUVO::sharing::db::EntryDB;
 using TUVO::sharing::db::Result;
 using TUVO::sharing::db::Row;
+using TUVO::sharing::db::TokenDB;
 using TUVO::sharing::record::Entry;
 
 MaybeProblem NoSuchLink() {
@@ -63,6 +66,16 @@ MaybeProblem CheckHashFree(BaseDB& db, const std::string& hash, int id) {
                              : std::nullopt;
 }
 
+// Whether nobody who is in has proved what the link asks for now. A password is asked for at the
+// login alone; accounts are looked at again at every visit, so that a change of those needs no
+// more.
+bool AsksAnew(const Entry& before, const Entry& after) {
+  return after.get_protect_type() == Entry::PROTECT_PASSWORD &&
+         (before.get_protect_type() != Entry::PROTECT_PASSWORD ||
+          before.get_protect_password() != after.get_protect_password() ||
+          before.get_protect_password_salt() != after.get_protect_password_salt());
+}
+
 MaybeProblem Purge(BaseDB& db, Scope scope, const std::string& project, int* deleted) {
   Condition ended(db);
   ended.Where(EndedClause(std::time(nullptr)));
@@ -104,22 +117,28 @@ MaybeProblem CreateLink(BaseDB& db, Entry* link) {
 }
 
 MaybeProblem FindLink(BaseDB& db, const LinkName& name, Scope scope, Entry* link) {
-  return Find(db, name, scope, link);
+  MaybeProblem problem = Find(db, name, scope, link);
+  if (problem && problem->error == Error::kInternal) {
+    LogDatabaseFault(db.GetLastError());
+  }
+  return problem;
 }
 
 MaybeProblem ChangeLink(BaseDB& db, const LinkName& name, Scope scope,
                         const std::function<MaybeProblem(Entry*)>& change, Entry* link) {
+  TokenDB tokens(db);  // ends, and checkpoints, behind the transaction
   return InTransaction(db, [&](EntryDB& links) {
     MaybeProblem problem = Find(db, name, scope, link);
     if (problem) {
       return problem;
     }
-    const std::string hash = link->get_hash();
+    const Entry before = *link;
     problem = change(link);
-    if (!problem && link->get_hash() != hash) {
+    if (!problem && link->get_hash() != before.get_hash()) {
       problem = CheckHashFree(db, link->get_hash(), link->get_id());
     }
-    if (!problem && !links.Update(*link)) {
+    if (!problem &&
+        (!links.Update(*link) || (AsksAnew(before, *link) && !tokens.PurgeByEntry(*link)))) {
       problem = InternalFault();
     }
     return problem;

@@ -32,7 +32,8 @@ MaybeProblem FindLink(TUVO::sharing::db::BaseDB& db, const LinkName& name, Scope
 
 // Reads the link, lets `change` change it, and writes it, as one step (transaction.h: `change` may
 // be called again). Nothing is written when `change` returns a problem; a changed hash may be one
-// that is taken. On success `link` is the link as it was written.
+// that is taken. When the link then asks for a password that it did not ask for before, everybody
+// who is in is signed out. On success `link` is the link as it was written.
 MaybeProblem ChangeLink(TUVO::sharing::db::BaseDB& db, const LinkName& name, Scope scope,
                         const std::function<MaybeProblem(TUVO::sharing::record::Entry*)>& change,
                         TUVO::sharing::record::Entry* link);

@@ -38,8 +38,7 @@ std::string DescriptorPath(int fd) {
   return "/proc/self/fd/" + std::to_string(fd);
 }
 
-// What the kernel calls the open file: resolved, and of this very file, whatever has become of the
-// path meanwhile.
+// What the kernel calls the open file: resolved, whatever has become of the path meanwhile.
 std::optional<std::string> PathOf(int fd) {
   std::array<char, PATH_MAX> path{};
   const ssize_t length = readlink(DescriptorPath(fd).c_str(), path.data(), path.size());
@@ -64,6 +63,16 @@ common::UniqueFd OpenForReading(const std::string& path) {
   return {};
 }
 
+// Whether whoever follows `path` from here comes to that very file. By way of /proc an owner
+// reaches files of a mount namespace of their own, whose paths lead to somebody else's files in
+// this one, and files that are deleted, whose paths lead nowhere yet.
+bool LeadsTo(const std::string& path, const struct stat& file) {
+  const common::UniqueFd found(open(path.c_str(), O_PATH | O_NOFOLLOW | O_CLOEXEC));
+  struct stat st {};
+  return found.get() >= 0 && fstat(found.get(), &st) == 0 && st.st_dev == file.st_dev &&
+         st.st_ino == file.st_ino;
+}
+
 // Opened as a mere place first: opening a device or a pipe for reading may do something.
 std::optional<std::string> ReadableFile(const std::string& path) {
   const common::UniqueFd place(open(path.c_str(), O_PATH | O_CLOEXEC));
@@ -72,7 +81,11 @@ std::optional<std::string> ReadableFile(const std::string& path) {
     return std::nullopt;
   }
   const common::UniqueFd file = OpenForReading(DescriptorPath(place.get()));
-  return file.get() < 0 ? std::nullopt : PathOf(file.get());
+  if (file.get() < 0) {
+    return std::nullopt;
+  }
+  std::optional<std::string> resolved = PathOf(file.get());
+  return resolved && LeadsTo(*resolved, st) ? resolved : std::nullopt;
 }
 
 bool IsBelow(const std::string& path, const std::string& folder) {

@@ -11,14 +11,15 @@ namespace owner {
 
 enum class FileAnswer {
   kMay,
-  kNotReadable,  // not there, no regular file, or the owner's account may not read it
+  kNotReadable,  // not there, no regular file, not at its path, or the owner may not read it
   kOutside,      // below none of the folders
   kCannotTell,   // the owner's identity cannot be taken, or it took too long (logged)
 };
 
 // Looks at `path` with the ids and groups of `owner`, in a child process: the answer is the
-// kernel's own, access lists and the like included. `resolved` is the file's path without symbolic
-// links and "..", as the kernel has it for the file that was looked at, and is set with kMay alone.
+// kernel's own, access lists and the like included. `resolved` is the path, without symbolic links
+// and "..", at which the very file that was looked at is found from here, and is set with kMay
+// alone.
 // A process that cannot become somebody else (root is none of its ids) can tell for its own user
 // only. A folder that does not exist admits nothing. A file on
 // which somebody holds a lease for 2 seconds longer is not readable, and after 5 seconds the child

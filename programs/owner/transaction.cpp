@@ -2,6 +2,8 @@
 
 #include <string>
 
+#include "owner/database_log.h"
+
 namespace owner {
 
 namespace {
@@ -10,10 +12,12 @@ using TUVO::sharing::db::BaseDB;
 using TUVO::sharing::db::EntryDB;
 using Work = std::function<MaybeProblem(EntryDB&)>;
 
-// What SQLite says of a file that another connection writes to, and of a transaction whose reads
-// another connection's write has made stale.
-bool IsLocked(const BaseDB& db) {
-  return db.GetLastError().find("locked") != std::string::npos;
+// A success leaves the connection's error as it was: of an earlier statement, maybe of another
+// command. A statement that the connection itself refuses puts a reason of its own there, which is
+// returned: as long as it stands there, nothing else has failed.
+std::string ForgetError(BaseDB& db) {
+  db.Execute(std::string(1, '\0'));
+  return db.GetLastError();
 }
 
 // Takes back what was not committed.
@@ -29,10 +33,9 @@ class OpenTransaction {
   OpenTransaction& operator=(const OpenTransaction&) = delete;
 
   bool IsOpen() const { return open_; }
-  // A commit that fails is taken back by the connection itself.
   bool Commit() {
-    open_ = false;
-    return db_.Commit();
+    open_ = !db_.Execute("COMMIT");
+    return !open_;
   }
 
  private:
@@ -46,33 +49,53 @@ bool TakeLock(BaseDB& db) {
   return db.Execute("DELETE FROM entry WHERE 0");
 }
 
-MaybeProblem Attempt(BaseDB& db, EntryDB& links, const Work& work, Locking locking) {
-  OpenTransaction transaction(db);
-  if (!transaction.IsOpen() || (locking == Locking::kFirst && !TakeLock(db))) {
+struct Outcome {
+  MaybeProblem problem;
+  std::string reason;  // the connection's, of a statement that failed; empty: none did
+};
+
+MaybeProblem WorkAndCommit(BaseDB& db, EntryDB& links, const Work& work, Locking locking,
+                           OpenTransaction* transaction) {
+  if (!transaction->IsOpen() || (locking == Locking::kFirst && !TakeLock(db))) {
     return InternalFault();
   }
   MaybeProblem problem = work(links);
-  if (!problem && !transaction.Commit()) {
-    problem = InternalFault();
-  }
-  return problem;
+  return problem || transaction->Commit() ? problem : InternalFault();
 }
 
-bool MetAnotherWriter(const BaseDB& db, const MaybeProblem& problem) {
-  return problem && problem->error == Error::kInternal && IsLocked(db);
+Outcome Attempt(BaseDB& db, EntryDB& links, const Work& work, Locking locking) {
+  const std::string no_error = ForgetError(db);
+  OpenTransaction transaction(db);
+  Outcome outcome;
+  outcome.problem = WorkAndCommit(db, links, work, locking, &transaction);
+  // Now: SQLite has taken some failed transactions back already, and to do so again is an error.
+  const std::string reason = db.GetLastError();
+  outcome.reason = reason == no_error ? "" : reason;
+  return outcome;
+}
+
+// What SQLite says of a file that another connection writes to, and of a transaction whose reads
+// another connection's write has made stale.
+bool MetAnotherWriter(const Outcome& outcome) {
+  return outcome.problem && outcome.problem->error == Error::kInternal &&
+         outcome.reason.find("locked") != std::string::npos;
 }
 
 }  // namespace
 
 MaybeProblem InTransaction(BaseDB& db, const Work& work, Locking locking) {
   EntryDB links(db);  // ends, and checkpoints, behind the last transaction
-  MaybeProblem problem = Attempt(db, links, work, locking);
-  if (locking != Locking::kFirst && MetAnotherWriter(db, problem)) {
-    problem = Attempt(db, links, work, Locking::kFirst);
+  Outcome outcome = Attempt(db, links, work, locking);
+  if (locking != Locking::kFirst && MetAnotherWriter(outcome)) {
+    outcome = Attempt(db, links, work, Locking::kFirst);
   }
-  return MetAnotherWriter(db, problem)
-             ? Fault(Error::kBusy, "other programs keep the links locked; try again")
-             : problem;
+  if (MetAnotherWriter(outcome)) {
+    return Fault(Error::kBusy, "other programs keep the links locked; try again");
+  }
+  if (outcome.problem && outcome.problem->error == Error::kInternal && !outcome.reason.empty()) {
+    LogDatabaseFault(outcome.reason);
+  }
+  return outcome.problem;
 }
 
 }  // namespace owner

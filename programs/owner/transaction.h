@@ -22,7 +22,8 @@ enum class Locking {
 // beginning, this time with the file locked before, for which it waits up to 10 seconds: `work`
 // must do nothing that cannot be repeated, and return InternalFault() when a statement failed. With
 // Locking::kFirst it runs so at once, and never again. A problem that it returns takes everything
-// back and is returned; Error::kBusy says that the file could not be had.
+// back and is returned; Error::kBusy says that the file could not be had, and with kInternal the
+// connection's reason is in the system log.
 // `work` must not make stores of its own: the end of a store checkpoints, which a transaction
 // forbids. May throw std::bad_alloc; everything is then taken back.
 MaybeProblem InTransaction(TUVO::sharing::db::BaseDB& db,

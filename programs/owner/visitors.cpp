@@ -6,12 +6,15 @@
 #include <tuvosharing/token_db.h>
 #include <tuvosharing/user_group.h>
 
+#include "owner/transaction.h"
+
 namespace owner {
 
 namespace {
 
 using TUVO::sharing::db::BaseDB;
 using TUVO::sharing::db::Condition;
+using TUVO::sharing::db::EntryDB;
 using TUVO::sharing::db::SessionDB;
 using TUVO::sharing::db::TokenDB;
 using TUVO::sharing::record::Entry;
@@ -61,6 +64,18 @@ MaybeProblem ListVisitors(BaseDB& db, const Entry& link, int most, std::time_t n
     }
   }
   return std::nullopt;
+}
+
+MaybeProblem SignOutVisitors(BaseDB& db, const LinkName& name, Scope scope, std::time_t now,
+                             Entry* link, int* count) {
+  TokenDB tokens(db);  // ends, and checkpoints, behind the transaction
+  return InTransaction(db, [&](EntryDB& /*links*/) {
+    if (MaybeProblem problem = FindLink(db, name, scope, link)) {
+      return problem;
+    }
+    OfLink(*link, now, &tokens.GetCondition());
+    return tokens.Count(*count) && tokens.PurgeByEntry(*link) ? std::nullopt : InternalFault();
+  });
 }
 
 }  // namespace owner

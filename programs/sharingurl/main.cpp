@@ -13,6 +13,7 @@
 #include <vector>
 
 #include "common/config.h"
+#include "common/process_start.h"
 #include "sharingurl/address.h"
 #include "sharingurl/own_name.h"
 #include "sharingurl/request.h"
@@ -102,19 +103,6 @@ std::vector<std::string> TakeArguments(int count, char** arguments) {
   return taken;
 }
 
-// Opens what is closed of the three standard descriptors: otherwise the system log's socket would
-// become one of them, and what is printed a line of the log. False when the standard output was
-// closed, so that there is nobody to answer, or when nothing can be opened.
-bool HasStandardOutput() {
-  bool has = true;
-  for (const int fd : {STDIN_FILENO, STDOUT_FILENO, STDERR_FILENO}) {
-    if (fcntl(fd, F_GETFD) < 0) {
-      has = open("/dev/null", O_RDWR) == fd && has && fd != STDOUT_FILENO;
-    }
-  }
-  return has;
-}
-
 int Run(const std::vector<std::string>& arguments) {
   if (arguments.size() == 1 && arguments[0] == "--help") {
     return std::fputs(kUsage, stdout) < 0 || std::fflush(stdout) != 0 ? kFailed : 0;
@@ -132,7 +120,8 @@ int Run(const std::vector<std::string>& arguments) {
 int main(int count, char** arguments) {
   try {
     const std::vector<std::string> taken = TakeArguments(count, arguments);
-    if (!HasStandardOutput()) {
+    const bool has_output = fcntl(STDOUT_FILENO, F_GETFD) >= 0;
+    if (!common::StartProcess() || !has_output) {
       Complain("the standard output is closed");
       return kFailed;
     }

@@ -7,7 +7,7 @@ const ENTRY = "/webapi/entry.cgi";
 const LINK = "TUVO.Sharing.Link";
 const INFO = "TUVO.API.Info";
 const LONGEST_WAIT = 30000;
-const CHANGING_METHODS = ["create", "set", "delete", "delete_expired"];
+const CHANGING_METHODS = ["create", "set", "delete", "delete_expired", "sign_out"];
 
 // Codes of the API that the page treats in a way of their own, and two more for answers that did
 // not come from it.
@@ -18,7 +18,6 @@ export const Code = {
   NOT_ALLOWED: 106,
   FOREIGN_SITE: 109,
   NO_SUCH_LINK: 205,
-  CHANGING: 207,
 };
 
 // What the document is told when a link turns out to be gone: what it shows is out of date.

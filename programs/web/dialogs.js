@@ -135,13 +135,20 @@ function showQr(answer) {
 
 // ---- the visitors ----
 
-export async function showVisitors(link, comeBack) {
-  const rows = byId("visitors-rows");
-  rows.replaceChildren();
+// `about` is the link's identity in words, for the question before all are signed out.
+export function showVisitors(link, about, comeBack) {
+  byId("visitors-rows").replaceChildren();
   byId("visitors-scroll").hidden = true;
+  byId("sign-out").hidden = true;
+  byId("sign-out").onclick = () => signOut(link, about);
   byId("visitors-heading").replaceChildren("Visitors of ", ...texts.quoted(link));
-  byId("visitors-count").textContent = "Loading…";
   open(byId("visitors-dialog"), comeBack);
+  return listVisitors(link, "");
+}
+
+// `before` is what has happened since the last time, as a sentence.
+async function listVisitors(link, before) {
+  byId("visitors-count").textContent = before + "Loading…";
   const isWanted = stillOpen(byId("visitors-dialog"));
   try {
     const answer = await api.link("sessions", {id: link.id});
@@ -149,13 +156,34 @@ export async function showVisitors(link, comeBack) {
       return;
     }
     byId("visitors-scroll").hidden = answer.sessions.length === 0;
-    rows.replaceChildren(...answer.sessions.map(visitorRow));
-    byId("visitors-count").textContent = visitorsCount(answer);
+    byId("sign-out").hidden = answer.total === 0;
+    byId("visitors-rows").replaceChildren(...answer.sessions.map(visitorRow));
+    byId("visitors-count").textContent = before + visitorsCount(answer);
   } catch (error) {
     if (isWanted()) {
-      byId("visitors-count").textContent = texts.describe(error);
+      byId("visitors-count").textContent = before + texts.describe(error);
     }
   }
+}
+
+function signOut(link, about) {
+  const isWanted = stillOpen(byId("visitors-dialog"));
+  ask({
+    heading: ["Sign everyone out of ", ...texts.quoted(link), "?"],
+    text: [...about, " Whoever is in has to open the link anew, and counts as one more use. Who is \
+to stay out needs a link that is disabled, or another password, first."],
+    yes: "Sign everyone out",
+    act: () => api.link("sign_out", {id: link.id}),
+    after: ({signed_out: number}) => {
+      const done = texts.plural(number, "visitor is", "visitors are") + " signed out. ";
+      if (isWanted()) {
+        listVisitors(link, done);
+      } else {
+        notice.show(done);
+      }
+    },
+    comeBack: () => byId("visitors-close").focus(),
+  });
 }
 
 function visitorRow(session) {

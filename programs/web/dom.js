@@ -32,6 +32,17 @@ export function say(target, text) {
   target.hidden = text === "";
 }
 
+// A field's mistake, told beside it in the element that its id and "-error" name; an empty text takes
+// the mistake back.
+export function tellMistake(field, text) {
+  say(byId(field + "-error"), text);
+  if (text === "") {
+    byId(field).removeAttribute("aria-invalid");
+  } else {
+    byId(field).setAttribute("aria-invalid", "true");
+  }
+}
+
 // A button that cannot be used now keeps the focus, and says that it cannot.
 export function setUsable(button, usable) {
   button.setAttribute("aria-disabled", String(!usable));

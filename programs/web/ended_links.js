@@ -3,11 +3,12 @@
 
 import * as api from "./api.js";
 import {attempt, open} from "./dialogs.js";
-import {byId, say, setUsable} from "./dom.js";
+import {byId, say, setUsable, tellMistake} from "./dom.js";
 import * as texts from "./texts.js";
 import {harmless} from "./visible_text.js";
 
 const PAUSE = 300;
+const FIELDS = {project_name: "ended-project", owner_user: "ended-owner"}; // by the API's names
 
 let counting = 0;
 let timer;
@@ -37,6 +38,12 @@ function buttonName({project_name, owner_user}, number) {
   return `Remove ${links} of ${owner_user ? harmless(owner_user) : "everybody"}${ofProject}`;
 }
 
+function tellMistakes(error) {
+  for (const [name, field] of Object.entries(FIELDS)) {
+    tellMistake(field, error?.field === name ? texts.describe(error) : "");
+  }
+}
+
 // The number is not known, or not any more.
 function forget() {
   counting++;
@@ -53,15 +60,18 @@ async function count() {
   byId("ended-count").textContent = "Counting…";
   let text;
   let number = 0;
+  let mistake = null;
   try {
     number = (await api.link("delete_expired", {...asked, dry_run: true})).deleted;
     text = number === 0 ? "There are none now." : `Now ${texts.plural(number, "link", "links")}.`;
   } catch (error) {
-    text = texts.describe(error);
+    mistake = error.field in FIELDS ? error : null;
+    text = mistake ? "Not counted: a field needs another look." : texts.describe(error);
   }
   if (mine !== counting) {
     return;
   }
+  tellMistakes(mistake);
   byId("ended-count").textContent = text;
   if (number > 0 && !removing) {
     counted = asked;
@@ -90,7 +100,7 @@ function remove(done) {
 
 // `done` is called with the number of links that were removed.
 export function start(done) {
-  for (const id of ["ended-project", "ended-owner"]) {
+  for (const id of Object.values(FIELDS)) {
     byId(id).addEventListener("input", () => {
       forget();
       byId("ended-count").textContent = "Counting…";
@@ -109,6 +119,7 @@ export function ask(account, project) {
   byId("ended-owner-field").hidden = !account.administrator;
   byId("ended-owner").value = account.user;
   say(byId("ended-problem"), "");
+  tellMistakes(null);
   removing = false;
   open(byId("ended-dialog"));
   count();

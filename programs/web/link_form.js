@@ -6,7 +6,7 @@
 import * as api from "./api.js";
 import * as clock from "./clock.js";
 import {ask, onEscape, open, stillOpen} from "./dialogs.js";
-import {byId, isUsable, say, setUsable} from "./dom.js";
+import {byId, isUsable, say, setUsable, tellMistake} from "./dom.js";
 import {inexactNumber} from "./json_numbers.js";
 import * as notice from "./notice.js";
 import * as texts from "./texts.js";
@@ -301,7 +301,8 @@ function showHelp(shareFolders) {
       ? "Its whole path on the server."
       : "Its whole path on the server, below " + shareFolders.join(" or ") + ".";
   byId("protect_password-help").textContent = made && link.protect_type === "password"
-      ? "Never shown. Leave it empty to keep the one that the link has."
+      ? "Never shown. Leave it empty to keep the one that the link has; another one signs out \
+everybody who is in."
       : "Never shown again; visitors get it from you.";
   byId("protect_users-help").textContent = "One name a line." + (made
       ? " Accounts that are gone are not shown; changing the list drops them." : "");
@@ -347,8 +348,7 @@ function adapt() {
 function clearMistakes() {
   say(byId("link-summary"), "");
   for (const field of FIELDS) {
-    say(byId(field + "-error"), "");
-    byId(field).removeAttribute("aria-invalid");
+    tellMistake(field, "");
   }
 }
 
@@ -367,8 +367,7 @@ function showMistakes(mistakes, general = "") {
     }
   }
   for (const field of shown) {
-    say(byId(field + "-error"), mistakes[field]);
-    byId(field).setAttribute("aria-invalid", "true");
+    tellMistake(field, mistakes[field]);
   }
   if (shown.length > 0) {
     summary.unshift("The link is not saved: " +

@@ -3,7 +3,7 @@
 import * as api from "./api.js";
 import * as clock from "./clock.js";
 import * as dialogs from "./dialogs.js";
-import {byId, element, isUsable, say, setUsable} from "./dom.js";
+import {byId, element, isUsable, say, setUsable, tellMistake} from "./dom.js";
 import * as endedLinks from "./ended_links.js";
 import * as linkForm from "./link_form.js";
 import {LinkTable} from "./link_table.js";
@@ -30,7 +30,7 @@ const table = new LinkTable({
   edit: (link) => editLink(link),
   copy: (link) => copyAddress(link),
   qr: (link) => showQr(link),
-  visitors: (link) => dialogs.showVisitors(link, backTo(link.id, "visitors")),
+  visitors: (link) => dialogs.showVisitors(link, identity(link), backTo(link.id, "visitors")),
   toggle: (link, button) => toggle(link, button),
   remove: (link) => remove(link),
 });
@@ -67,7 +67,13 @@ async function load() {
     }
     render(answer, lastPage);
   } catch (error) {
-    if (!mine.signal.aborted) {
+    if (mine.signal.aborted) {
+      return;
+    }
+    const smaller = error.field === "limit" ? viewState.withSmallerPages(view) : null;
+    if (smaller) {
+      await show(smaller);
+    } else {
       showLoadProblem(error);
     }
   } finally {
@@ -141,13 +147,7 @@ function showFrame() {
 // `errors` by the filters' names in the API.
 function showFilterErrors(errors = {}) {
   for (const [name, id] of Object.entries(FILTER_FIELDS)) {
-    const text = errors[viewState.ARGUMENTS[name]] ?? "";
-    say(byId(id + "-error"), text);
-    if (text === "") {
-      byId(id).removeAttribute("aria-invalid");
-    } else {
-      byId(id).setAttribute("aria-invalid", "true");
-    }
+    tellMistake(id, errors[viewState.ARGUMENTS[name]] ?? "");
   }
 }
 

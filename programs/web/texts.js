@@ -98,8 +98,6 @@ export function describe(error) {
       return "The server gives no usable answer, so " + consequence(error);
     case Code.NO_SUCH_LINK:
       return "This link does not exist any more.";
-    case Code.CHANGING:
-      return "Other programs keep changing this link. Try again.";
     default:
       return sentence(error.message || "the request failed");
   }

@@ -67,6 +67,13 @@ export function write(view) {
   history.replaceState(null, "", fragment ? "#" + fragment : location.pathname + location.search);
 }
 
+// The view with the next smaller pages, of which one begins with the same link: the links of a page
+// may hold more than one answer of the server's does. Nothing when there are none smaller.
+export function withSmallerPages(view) {
+  const size = PAGE_SIZES.findLast((choice) => choice < view.size);
+  return size && {...view, size, page: Math.floor((view.page - 1) * view.size / size) + 1};
+}
+
 // The arguments of the API's method "list".
 export function query(view) {
   const settings = {

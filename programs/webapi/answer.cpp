@@ -2,6 +2,8 @@
 
 #include <utility>
 
+#include "owner/argument.h"
+
 namespace webapi {
 
 namespace {
@@ -40,6 +42,17 @@ int StatusOf(Error error) {
 }
 
 }  // namespace
+
+std::string TextOf(const Answer& answer) {
+  if (answer.links.empty()) {
+    return owner::WriteJson(answer.document);
+  }
+  const std::string others = owner::WriteJson(answer.document["data"]).substr(1);
+  std::string text = R"({"data":{"links":)";
+  text.reserve(text.size() + answer.links.size() + others.size() + 16);
+  text.append(answer.links).append(others == "}" ? "" : ",").append(others);
+  return text.append(R"(,"success":true})");
+}
 
 Json::Value SuccessAnswer(Json::Value data) {
   Json::Value answer(Json::objectValue);

@@ -4,9 +4,19 @@
 
 #include <json/value.h>
 
+#include <string>
+
 #include "owner/problem.h"
 
 namespace webapi {
+
+struct Answer {
+  Json::Value document;  // one that SuccessAnswer or FailureAnswer made
+  std::string links;     // member "links" of its data, written already; empty: there is none
+};
+
+// The answer as it goes out, without a line feed.
+std::string TextOf(const Answer& answer);
 
 // {"success": true, "data": …}
 Json::Value SuccessAnswer(Json::Value data);

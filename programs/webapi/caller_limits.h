@@ -9,9 +9,14 @@ namespace webapi {
 // for a change and the line in the system log that belongs to it.
 bool TakeDescriptors();
 
-// The keys and the reads and writes of a terminal that stop a program do not stop this one: stopped
-// in the middle of a change, it would hold everybody else up.
-void IgnoreTerminalStops();
+// Signals and timers that the caller has in hand do not stop or end this program, and neither does
+// what a terminal sends: stopped in the middle of a change, it would hold everybody else up, and
+// ended behind one, leave no line of it in the log. What it starts is ended by them as usual.
+void OutliveCallersSignals();
+
+// Takes back the caller's limits of time and size, as far as the process may: with the effective
+// user root all of them.
+void LiftLimits();
 
 }  // namespace webapi
 

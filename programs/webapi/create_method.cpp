@@ -62,6 +62,7 @@ MaybeProblem CreateMethod(Turn* turn) {
     return problem;
   }
   turn->link = link.get_id();
+  turn->note_change();
   AnswerLink(link, turn);
   return std::nullopt;
 }

@@ -6,7 +6,6 @@
 
 #include "common/exchange.h"
 #include "common/gateway.h"
-#include "owner/argument.h"
 #include "webapi/answer.h"
 #include "webapi/handler.h"
 #include "webapi/http_answer.h"
@@ -22,10 +21,10 @@ bool Send(common::Exchange& exchange, int status, std::string_view body) {
          (method == webapi::HttpMethod::kHead || exchange.Write(body)) && exchange.Finish();
 }
 
-Json::Value AnswerTo(common::Exchange& exchange) {
+webapi::Answer AnswerTo(common::Exchange& exchange) {
   webapi::Call call;
   if (const owner::MaybeProblem problem = webapi::ReadHttpCall(exchange, &call)) {
-    return webapi::FailureAnswer(*problem);
+    return {webapi::FailureAnswer(*problem), {}};
   }
   return webapi::Handle(call);
 }
@@ -38,9 +37,9 @@ bool Serve(common::Exchange& exchange) {
   int status = kInternalStatus;
   std::string body;
   try {
-    const Json::Value answer = AnswerTo(exchange);
-    status = webapi::StatusOf(answer);
-    body = owner::WriteJson(answer);
+    const webapi::Answer answer = AnswerTo(exchange);
+    status = webapi::StatusOf(answer.document);
+    body = webapi::TextOf(answer);
   } catch (const std::exception& error) {
     syslog(LOG_ERR, "entry_main:%d request failed: %s", __LINE__, error.what());
     Apologize(exchange);

@@ -46,9 +46,26 @@ struct Outcome {
   const Method* method = nullptr;
   MaybeProblem problem;
   Json::Value data = Json::Value(Json::objectValue);
+  std::string links;
   int link = 0;
   bool is_event = true;
 };
+
+void LogChange(const Call& call, Outcome* outcome) {
+  if (outcome->method == nullptr || !outcome->method->changes || !outcome->is_event) {
+    return;
+  }
+  outcome->is_event = false;  // one line
+  common::Event event{};
+  event.name = outcome->method->name;
+  event.link = outcome->link;
+  event.address = call.address;
+  event.result = outcome->problem ? static_cast<int>(outcome->problem->error) : kDone;
+  if (call.account) {
+    event.by = call.account->uid;
+  }
+  common::LogEvent(event);
+}
 
 MaybeProblem Run(const Call& call, Outcome* outcome) {
   if (MaybeProblem problem = FindMethod(call, &outcome->method)) {
@@ -61,26 +78,15 @@ MaybeProblem Run(const Call& call, Outcome* outcome) {
   if (MaybeProblem problem = ReadArguments(call, *outcome->method, &arguments)) {
     return problem;
   }
-  Turn turn{*call.account, arguments,     call.place,       std::time(nullptr),
-            outcome->data, outcome->link, outcome->is_event};
+  const std::function<void()> note_change = [&call, outcome] { LogChange(call, outcome); };
+  Turn turn{*call.account,  arguments,     call.place,        std::time(nullptr), outcome->data,
+            outcome->links, outcome->link, outcome->is_event, note_change};
   return outcome->method->run(&turn);
-}
-
-void LogChange(const Call& call, const Outcome& outcome) {
-  common::Event event{};
-  event.name = outcome.method->name;
-  event.link = outcome.link;
-  event.address = call.address;
-  event.result = outcome.problem ? static_cast<int>(outcome.problem->error) : kDone;
-  if (call.account) {
-    event.by = call.account->uid;
-  }
-  common::LogEvent(event);
 }
 
 }  // namespace
 
-Json::Value Handle(const Call& call) {
+Answer Handle(const Call& call) {
   Outcome outcome;
   try {
     outcome.problem = Run(call, &outcome);
@@ -88,10 +94,11 @@ Json::Value Handle(const Call& call) {
     syslog(LOG_ERR, "handler:%d request failed: %s", __LINE__, error.what());
     outcome.problem = owner::InternalFault();
   }
-  if (outcome.method != nullptr && outcome.method->changes && outcome.is_event) {
-    LogChange(call, outcome);
+  LogChange(call, &outcome);
+  if (outcome.problem) {
+    return {FailureAnswer(*outcome.problem), {}};
   }
-  return outcome.problem ? FailureAnswer(*outcome.problem) : SuccessAnswer(std::move(outcome.data));
+  return {SuccessAnswer(std::move(outcome.data)), std::move(outcome.links)};
 }
 
 }  // namespace webapi

@@ -61,7 +61,8 @@ Api LinkApi() {
            {"set", true, With(owner::SettingArguments(), id), SetMethod},
            {"delete", true, NamesALink(), DeleteMethod},
            {"delete_expired", true, ForDeleteExpired(), DeleteExpiredMethod},
-           {"sessions", false, NamesALink(), SessionsMethod}}};
+           {"sessions", false, NamesALink(), SessionsMethod},
+           {"sign_out", true, NamesALink(), SignOutMethod}}};
 }
 
 }  // namespace webapi

@@ -17,6 +17,7 @@ owner::MaybeProblem SetMethod(Turn* turn);
 owner::MaybeProblem DeleteMethod(Turn* turn);
 owner::MaybeProblem DeleteExpiredMethod(Turn* turn);
 owner::MaybeProblem SessionsMethod(Turn* turn);
+owner::MaybeProblem SignOutMethod(Turn* turn);
 
 }  // namespace webapi
 

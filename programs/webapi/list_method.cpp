@@ -23,6 +23,9 @@ using owner::MaybeProblem;
 constexpr int kLargestPage = 500;
 constexpr size_t kLongestSearch = 64;
 
+// Of the links in an answer, as text. Any number of owners may ask at a time.
+constexpr size_t kLargestList = size_t{16} << 20;
+
 MaybeProblem ReadPage(const Json::Value& arguments, ListRequest* request) {
   request->offset = arguments.get("offset", request->offset).asInt();
   request->limit = arguments.get("limit", request->limit).asInt();
@@ -89,6 +92,31 @@ MaybeProblem ReadRequest(const Turn& turn, ListRequest* request) {
   return ReadFilters(turn, request);
 }
 
+// Links as they come, as the text of a list.
+class ListText {
+ public:
+  explicit ListText(std::string* text) : text_(text) { *text_ = "["; }
+
+  // False when the list has no room for the link. A single one always has.
+  bool Add(const std::string& link) {
+    const bool is_first = text_->size() == 1;
+    full_ = !is_first && text_->size() + link.size() > kLargestList;
+    if (!full_) {
+      text_->append(is_first ? "" : ",").append(link);
+    }
+    return !full_;
+  }
+  // False when a link had no room.
+  bool Close() {
+    text_->append("]");
+    return !full_;
+  }
+
+ private:
+  std::string* text_;
+  bool full_ = false;
+};
+
 }  // namespace
 
 MaybeProblem ListMethod(Turn* turn) {
@@ -100,13 +128,17 @@ MaybeProblem ListMethod(Turn* turn) {
   if (MaybeProblem problem = OpenDatabase(&db)) {
     return problem;
   }
-  Json::Value& links = turn->data["links"] = Json::Value(Json::arrayValue);
-  const auto take = [&links, now = turn->now](const TUVO::sharing::record::Entry& link) {
-    links.append(owner::LinkJson(link, now));
+  ListText list(&turn->links);
+  const auto take = [&list, now = turn->now](const TUVO::sharing::record::Entry& link) {
+    return list.Add(owner::WriteJson(owner::LinkJson(link, now)));
   };
   int total = 0;
   if (MaybeProblem problem = owner::ForEachLink(*db, request, turn->now, take, &total)) {
     return problem;
+  }
+  if (!list.Close()) {
+    return Fault(Error::kBadValue,
+                 "asks for links with more data than an answer holds; ask for fewer", "limit");
   }
   turn->data["total"] = total;
   turn->data["offset"] = request.offset;

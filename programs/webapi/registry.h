@@ -5,6 +5,7 @@
 #include <json/value.h>
 
 #include <ctime>
+#include <functional>
 #include <string>
 #include <vector>
 
@@ -21,9 +22,13 @@ struct Turn {
   const Json::Value& arguments;  // checked against the method's list
   const owner::ServerPlace& place;
   std::time_t now;
-  Json::Value& data;  // the method's answer; an empty object at first
-  int& link;          // the row of the link that the method found or made, for the event log
+  Json::Value& data;   // the method's answer; an empty object at first
+  std::string& links;  // its member "links" in place of a tree, which takes a multiple of the room
+  int& link;           // the row of the link that the method found or made, for the event log
   bool& is_event;  // whether a method that changes something leaves its line there; true at first
+  // Writes the line of a change that is made: for a method that does more behind it. Otherwise it
+  // is written when the method returns.
+  const std::function<void()>& note_change;
 };
 
 struct Method {

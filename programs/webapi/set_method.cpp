@@ -70,6 +70,7 @@ MaybeProblem SetMethod(Turn* turn) {
   if (MaybeProblem problem = owner::ChangeLink(*db, name, ScopeOf(turn->account), change, &link)) {
     return problem;
   }
+  turn->note_change();
   AnswerLink(link, turn);
   return std::nullopt;
 }

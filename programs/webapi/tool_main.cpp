@@ -10,8 +10,10 @@
 #include <string>
 #include <vector>
 
+#include "common/core_dump.h"
 #include "common/environment.h"
 #include "common/privileges.h"
+#include "common/process_start.h"
 #include "common/stream.h"
 #include "owner/argument.h"
 #include "webapi/answer.h"
@@ -50,10 +52,10 @@ MaybeProblem ReadCommandLine(const std::vector<std::string>& arguments, webapi::
   return webapi::ReadCall(request, true, call);
 }
 
-Json::Value AnswerTo(const std::vector<std::string>& arguments, uid_t caller) {
+webapi::Answer AnswerTo(const std::vector<std::string>& arguments, uid_t caller) {
   webapi::Call call;
   if (const MaybeProblem problem = ReadCommandLine(arguments, &call)) {
-    return webapi::FailureAnswer(*problem);
+    return {webapi::FailureAnswer(*problem), {}};
   }
   call.account = owner::AccountOfUid(caller);
   call.address = kLocal;
@@ -73,9 +75,9 @@ bool Apologize() {
 int Run(const std::vector<std::string>& arguments, uid_t caller) {
   common::RequestEnvironment environment({});
   environment.Become(nullptr);
-  const Json::Value answer = AnswerTo(arguments, caller);
-  const bool printed = Print(owner::WriteJson(answer) + "\n");
-  return printed && webapi::IsSuccess(answer) ? EXIT_SUCCESS : EXIT_FAILURE;
+  const webapi::Answer answer = AnswerTo(arguments, caller);
+  const bool printed = Print(webapi::TextOf(answer) + "\n");
+  return printed && webapi::IsSuccess(answer.document) ? EXIT_SUCCESS : EXIT_FAILURE;
 }
 
 // The identity first: from then on the caller can neither stop the program nor look into it. The
@@ -84,6 +86,7 @@ bool Prepare() {
   if (!common::DropPrivileges() || !common::HideFromCaller() || !webapi::TakeDescriptors()) {
     return false;
   }
+  common::ForbidCore();
   openlog(kName, LOG_PID | LOG_NDELAY, LOG_USER);
   return true;
 }
@@ -91,10 +94,14 @@ bool Prepare() {
 }  // namespace
 
 int main(int argc, char* argv[]) {
+  if (!common::StartProcess()) {
+    return EXIT_FAILURE;
+  }
   // By its name and not by what the caller says that it is.
   openlog(kName, LOG_PID, LOG_USER);
   const uid_t caller = getuid();
-  webapi::IgnoreTerminalStops();
+  webapi::OutliveCallersSignals();
+  webapi::LiftLimits();
   (void)std::signal(SIGPIPE, SIG_IGN);
   const bool prepared = Prepare();
   try {

@@ -4,19 +4,16 @@ Skipped without axe-core, which scripts/test fetches (scripts/lib/axe.sh)."""
 
 import os
 import sys
-import unittest
 
-import browser
 import owner_page
 import visitor_server as vs
 from browser import By, Keys
-from owner_page import FILE, PHONE, WIDE, OwnerPage, make_link, make_links
+from owner_page import FILE, PHONE, WIDE, OwnerTest, make_link, make_links
 
 AXE = "build/tools/node_modules/axe-core/axe.min.js"  # from the project's folder
-SERVER = None
 LOOK = """
 const [rules, done] = arguments;
-axe.run(document, {runOnly: rules})
+axe.run(document, {runOnly: rules, resultTypes: ["violations"]})
     .then((found) => done({
       version: axe.version,
       passes: found.passes.length,
@@ -28,14 +25,8 @@ ALL = ["wcag2a", "wcag2aa", "wcag21a", "wcag21aa", "wcag22aa", "best-practice"]
 COLOURS = {"type": "rule", "values": ["color-contrast"]}  # all that depends on the scheme
 
 
-class AccessibilityTest(OwnerPage, unittest.TestCase):
+class AccessibilityTest(OwnerTest):
     axe = ""
-
-    def setUp(self):
-        owner_page.forget()
-        self.server = SERVER
-        self.start()
-        self.addCleanup(self.quit)
 
     def assert_accessible(self, state):
         """In both schemes."""
@@ -207,13 +198,16 @@ class OwnersPage(AccessibilityTest):
     def test_visitors_of_a_link(self):
         link = make_link(protect_title="One")
         self.sign_in()
-        self.go(f"http://127.0.0.1:{SERVER.port}/sharing/{link}")
+        self.go(f"http://127.0.0.1:{self.server.port}/sharing/{link}")
         self.press("Open")
         self.downloaded()
         self.open_page()
         self.act("One", "visitors")
         self.wait_for(lambda: self.dialog("visitors").text, lambda seen: "127.0.0.1" in seen)
         self.assert_accessible("visitors")
+        self.press_in("visitors", "Sign everyone out…")
+        self.dialog("question")
+        self.assert_accessible("sign everyone out?")
 
     def test_server_out_of_reach(self):
         self.sign_in()
@@ -226,7 +220,7 @@ class OwnersPage(AccessibilityTest):
 
 class VisitorsPages(AccessibilityTest):
     def open(self, path):
-        self.go(f"http://127.0.0.1:{SERVER.port}{path}")
+        self.go(f"http://127.0.0.1:{self.server.port}{path}")
 
     def test_forms(self):
         self.open("/sharing/" + make_link(protect_title="Our trip"))
@@ -289,18 +283,12 @@ class VisitorsPages(AccessibilityTest):
 
 
 def main():
-    global SERVER
-    os.environ["HOME"] = "/tmp"
     path = os.path.join(sys.argv[2], AXE)
     if not os.path.exists(path):
         vs.skip(f"axe-core is not at {AXE}: scripts/test says why it could not be fetched")
     with open(path) as file:
         AccessibilityTest.axe = file.read()
-    vs.install(sys.argv[1], sys.argv[2])
-    owner_page.lay_out()
-    with vs.WebServer() as SERVER:
-        owner_page.configure(SERVER)
-        return browser.run_tests()
+    return owner_page.run()
 
 
 if __name__ == "__main__":

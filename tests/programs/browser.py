@@ -40,6 +40,19 @@ FLAGS = ("--headless", "--no-sandbox", "--disable-gpu", "--disable-quic", "--no-
          "--host-resolver-rules=MAP * ~NOTFOUND, EXCLUDE 127.0.0.1", "--no-proxy-server",
          "--window-size=800,640")
 PATIENCE = 20  # seconds
+SET_SIZE = "Emulation.setDeviceMetricsOverride"
+
+
+class _Chrome(webdriver.Chrome):
+    """Remembers what was asked of the browser behind the driver's back."""
+
+    def __init__(self, **options):
+        self.commands = set()
+        super().__init__(**options)
+
+    def execute_cdp_cmd(self, cmd, cmd_args):
+        self.commands.add(cmd)
+        return super().execute_cdp_cmd(cmd, cmd_args)
 
 
 class _Running:
@@ -49,6 +62,7 @@ class _Running:
     idle = []
 
     def __init__(self):
+        self.account = None  # that it remembers, as the tests of a page that asks for one have it
         self.profile = tempfile.mkdtemp()
         self.downloads = os.path.join(self.profile, "downloads")
         os.mkdir(self.downloads)
@@ -60,7 +74,7 @@ class _Running:
                                                   "download.prompt_for_download": False})
         options.set_capability("goog:loggingPrefs", {"browser": "ALL", "performance": "ALL"})
         try:
-            self.browser = webdriver.Chrome(service=Service(DRIVER), options=options)
+            self.browser = _Chrome(service=Service(DRIVER), options=options)
         except BaseException:
             shutil.rmtree(self.profile, ignore_errors=True)
             raise
@@ -70,18 +84,24 @@ class _Running:
 
     def clean(self):
         """What a page left behind: in a new tab there is no emulation, no script and no page of the
-        old one; cookies, storage and cache are of the whole profile. The account that was signed in
-        last is remembered; tests sign in by themselves."""
-        old = self.browser.current_window_handle
-        self.browser.switch_to.new_window("tab")
-        new = self.browser.current_window_handle
-        self.browser.switch_to.window(old)
-        self.browser.close()
-        self.browser.switch_to.window(new)
+        old one, but it takes as long as all else here, and most tests only choose a size. Cookies,
+        storage and cache are of the whole profile. The account that was signed in last is
+        remembered."""
+        if self.browser.commands <= {SET_SIZE}:
+            self.browser.get("about:blank")
+            self.browser.execute_cdp_cmd("Emulation.clearDeviceMetricsOverride", {})
+        else:
+            old = self.browser.current_window_handle
+            self.browser.switch_to.new_window("tab")
+            new = self.browser.current_window_handle
+            self.browser.switch_to.window(old)
+            self.browser.close()
+            self.browser.switch_to.window(new)
         self.browser.execute_cdp_cmd("Network.clearBrowserCookies", {})
         self.browser.execute_cdp_cmd("Network.clearBrowserCache", {})
         self.browser.execute_cdp_cmd("Storage.clearDataForOrigin",
                                      {"origin": "*", "storageTypes": "all"})
+        self.browser.commands.clear()
         for log in "browser", "performance":
             self.browser.get_log(log)
         for name in os.listdir(self.downloads):
@@ -145,14 +165,14 @@ class Browser:
 
     def field(self, label):
         """By its label, as a person finds it: the one that is shown, and in front."""
-        dialogs = self.browser.find_elements(By.CSS_SELECTOR, "dialog[open]")
-        within = dialogs[-1] if dialogs else self.browser
-        for element in within.find_elements(By.XPATH, f".//label[normalize-space()='{label}']"):
-            if element.is_displayed():
-                identifier = element.get_attribute("for")
-                return (self.browser.find_element(By.ID, identifier) if identifier
-                        else element.find_element(By.TAG_NAME, "input"))
-        raise AssertionError(f"no field is labelled: {label}")
+        found = self.browser.execute_script(
+            "const within = [...document.querySelectorAll('dialog[open]')].at(-1) ?? document;"
+            "return [...within.querySelectorAll('label')]"
+            "    .find((one) => one.textContent.trim().replace(/\\s+/g, ' ') === arguments[0] &&"
+            "                   one.checkVisibility({visibilityProperty: true}))?.control", label)
+        if found is None:
+            raise AssertionError(f"no field is labelled: {label}")
+        return found
 
     def assert_focus(self, look):
         """On what `look` finds; pages give it away a moment after what they do."""
@@ -222,7 +242,7 @@ class Browser:
 
     def set_size(self, width, height):
         """Of the page itself; narrower than the windows that the browser opens."""
-        self.browser.execute_cdp_cmd("Emulation.setDeviceMetricsOverride", {
+        self.browser.execute_cdp_cmd(SET_SIZE, {
             "width": width, "height": height, "deviceScaleFactor": 1, "mobile": False})
 
 

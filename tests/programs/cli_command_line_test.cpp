@@ -44,6 +44,7 @@ TEST(CliCommandLine, CommandsAreUnderstood) {
         {"purge"},
         {"sessions"},
         {"tokens", "abc"},
+        {"signout", "abc", "--id", "7"},
         {"export", "-"},
         {"import"},
         {"check"},
@@ -68,6 +69,18 @@ TEST(CliCommandLine, OthersAreNot) {
   EXPECT_NE(Complaint({"list", "--limit", "x"}), "");
   EXPECT_NE(Complaint({"backup"}), "");
   EXPECT_NE(Complaint({"unblock"}), "");
+}
+
+TEST(CliCommandLine, NumbersAreDecimal) {
+  for (const char* number : {"0", "7", "010", "2147483647"}) {
+    EXPECT_EQ(Complaint({"list", "--limit", number}), "") << number;
+    EXPECT_EQ(Complaint({"list", "--offset", number}), "") << number;
+  }
+  for (const char* number : {"0x10", "1e3", "1.0", " 7", "7 ", "+7", "2147483648"}) {
+    EXPECT_NE(Complaint({"list", "--limit", number}).find("--limit"), std::string::npos) << number;
+    EXPECT_NE(Complaint({"list", "--offset", number}).find("--offset"), std::string::npos)
+        << number;
+  }
 }
 
 TEST(CliCommandLine, PasswordIsNoValue) {

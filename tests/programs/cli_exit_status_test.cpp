@@ -30,5 +30,12 @@ TEST(CliExitStatus, ProblemsHaveTheStatusOfTheirKind) {
   EXPECT_EQ(StatusOf(Error::kMissingArgument), ExitStatus::kUsage);
 }
 
+TEST(CliExitStatus, StatusesHaveACodeThatHasThatStatus) {
+  for (const ExitStatus status : {ExitStatus::kFailed, ExitStatus::kUsage, ExitStatus::kNoSuchLink,
+                                  ExitStatus::kTaken, ExitStatus::kNotAllowed, ExitStatus::kBusy}) {
+    EXPECT_EQ(StatusOf(UsualErrorOf(status)), status) << static_cast<int>(status);
+  }
+}
+
 }  // namespace
 }  // namespace cli

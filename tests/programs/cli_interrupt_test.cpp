@@ -1,10 +1,14 @@
 #include "cli/interrupt.h"
 
+#include <fcntl.h>
 #include <gtest/gtest.h>
+#include <sys/resource.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <cerrno>
 #include <csignal>
+#include <string>
 
 #include "support/child.h"
 
@@ -83,6 +87,63 @@ TEST(CliInterrupt, SignalEndsTheWaiting) {
     }
     EXPECT_THROW(WaitForInput(empty.ends[0]), Interruption);
     EXPECT_EQ(waitpid(child, nullptr, 0), child);
+    return 0;
+  });
+  EXPECT_EQ(status, 0);
+}
+
+// Fills a pipe that nobody reads.
+void Fill(int fd) {
+  const std::string piece(4096, 'x');
+  fcntl(fd, F_SETFL, O_NONBLOCK);
+  while (write(fd, piece.data(), piece.size()) > 0) {
+  }
+  fcntl(fd, F_SETFL, 0);
+}
+
+TEST(CliInterrupt, SignalEndsTheWaitingForAReader) {
+  const int status = tuvo_test::RunInChild([] {
+    NoteSignals();
+    const Pipe full;
+    Fill(full.ends[1]);
+    const pid_t parent = getpid();
+    const pid_t child = fork();
+    if (child == 0) {
+      usleep(200000);
+      (void)kill(parent, SIGTERM);
+      _exit(0);
+    }
+    EXPECT_THROW(WaitForOutput(full.ends[1]), Interruption);
+    EXPECT_THROW(WaitForOutput(full.ends[1]), Interruption);
+    EXPECT_EQ(waitpid(child, nullptr, 0), child);
+    return 0;
+  });
+  EXPECT_EQ(status, 0);
+}
+
+TEST(CliInterrupt, AfterASignalThereIsStillOutputWithoutWaiting) {
+  const int status = tuvo_test::RunInChild([] {
+    NoteSignals();
+    (void)raise(SIGTERM);
+    const Pipe empty;
+    WaitForOutput(empty.ends[1]);
+    const Pipe broken;
+    close(broken.ends[0]);
+    WaitForOutput(broken.ends[1]);
+    return 0;
+  });
+  EXPECT_EQ(status, 0);
+}
+
+TEST(CliInterrupt, FileThatBecomesTooLargeIsAnError) {
+  const int status = tuvo_test::RunInChild([] {
+    NoteSignals();
+    const rlimit kSmall{10, 10};
+    EXPECT_EQ(setrlimit(RLIMIT_FSIZE, &kSmall), 0);
+    const int fd = open("/tmp/large", O_CREAT | O_WRONLY | O_CLOEXEC, 0600);
+    EXPECT_EQ(write(fd, "0123456789", 10), 10);
+    EXPECT_EQ(write(fd, "x", 1), -1);
+    EXPECT_EQ(errno, EFBIG);
     return 0;
   });
   EXPECT_EQ(status, 0);

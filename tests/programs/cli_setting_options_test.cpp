@@ -89,7 +89,7 @@ TEST(CliSettingOptions, PathGoesIntoTheDataThatIsThere) {
   Json::Value app;
   app["x"] = 1;
   link.set_app(app);
-  EXPECT_FALSE(ApplyGivenSettings(ReadGivenSettings(options, "", kNow), {}, &link));
+  EXPECT_FALSE(ApplyGivenSettings(ReadGivenSettings(options, "", kNow), &link));
   EXPECT_EQ(link.get_app()["x"], 1);
   EXPECT_EQ(link.get_app()["path"], "/a/b");
 }
@@ -102,7 +102,7 @@ TEST(CliSettingOptions, PathGoesIntoTheDataThatIsGivenAlong) {
   Json::Value app;
   app["x"] = 1;
   link.set_app(app);
-  EXPECT_FALSE(ApplyGivenSettings(ReadGivenSettings(options, "", kNow), {}, &link));
+  EXPECT_FALSE(ApplyGivenSettings(ReadGivenSettings(options, "", kNow), &link));
   EXPECT_FALSE(link.get_app().isMember("x"));
   EXPECT_EQ(link.get_app()["y"], 2);
   EXPECT_EQ(link.get_app()["path"], "/tmp/b");
@@ -113,11 +113,24 @@ TEST(CliSettingOptions, PathProblemsNameThePath) {
   options.path = "/etc/passwd";
   Entry link;
   link.set_owner_uid(2001);
-  const owner::MaybeProblem problem =
-      ApplyGivenSettings(ReadGivenSettings(options, "", kNow), {"/tmp"}, &link);
+  const GivenSettings given = ReadGivenSettings(options, "", kNow);
+  EXPECT_FALSE(ApplyGivenSettings(given, &link));
+  owner::FileLook look;
+  const owner::MaybeProblem problem = LookAtGivenFile(given, {"/tmp"}, link, &look);
   ASSERT_TRUE(problem);
   EXPECT_EQ(problem->error, owner::Error::kFileNotAllowed);
   EXPECT_EQ(problem->field, "path");
+}
+
+TEST(CliSettingOptions, WhatDecidesWhichFileItIsTouchesTheFile) {
+  SettingOptions options;
+  EXPECT_FALSE(TouchesFile(ReadGivenSettings(Texts({{"protect_title", "x"}}), "", kNow)));
+  for (const auto& [argument, text] :
+       {std::pair("app", "{}"), {"project_name", "file"}, {"owner_user", "alice"}}) {
+    EXPECT_TRUE(TouchesFile(ReadGivenSettings(Texts({{argument, text}}), "", kNow))) << argument;
+  }
+  options.path = "/a";
+  EXPECT_TRUE(TouchesFile(ReadGivenSettings(options, "", kNow)));
 }
 
 TEST(CliSettingOptions, PasswordCanBeForgotten) {
@@ -127,11 +140,11 @@ TEST(CliSettingOptions, PasswordCanBeForgotten) {
   Entry link;
   link.set_protect_password("secret", true, Entry::ENCRYPT_ALGO_DEFAULT);
   link.set_protect_type(Entry::PROTECT_PASSWORD);
-  EXPECT_FALSE(ApplyGivenSettings(given, {}, &link));
+  EXPECT_FALSE(ApplyGivenSettings(given, &link));
   EXPECT_EQ(link.get_protect_type(), Entry::PROTECT_NONE);
   EXPECT_EQ(link.get_protect_password(), "");
   link.set_protect_users({"alice"}).set_protect_type(Entry::PROTECT_USER);
-  EXPECT_FALSE(ApplyGivenSettings(given, {}, &link));
+  EXPECT_FALSE(ApplyGivenSettings(given, &link));
   EXPECT_EQ(link.get_protect_type(), Entry::PROTECT_USER);
 }
 

@@ -17,7 +17,7 @@ PROGRAM = "/usr/tuvo/bin/tuvosharing"
 PAGE = "/usr/tuvo/share/man/man1/tuvosharing.1"
 COMPLETION = "/usr/tuvo/share/bash-completion/completions/tuvosharing"
 COMMANDS = ["create", "list", "show", "edit", "enable", "disable", "delete", "purge", "sessions",
-            "tokens", "export", "import", "check", "backup", "unblock"]
+            "tokens", "signout", "export", "import", "check", "backup", "unblock"]
 
 
 def help_of(*command):

@@ -93,8 +93,8 @@ class Spawned:
         """A connection with a request on it whose body is yet to come."""
         connection = connection or self.connect()
         begin = struct.pack(">HB5x", RESPONDER, KEEP_CONNECTION if keep else 0)
-        connection.sendall(record(BEGIN, begin) + record(PARAMS, _params(variables)) +
-                           record(PARAMS))
+        connection.sendall(record(BEGIN, begin))
+        _send(connection, PARAMS, _params(variables))
         return connection
 
     def request(self, variables, body=b"", keep=False):
@@ -105,9 +105,13 @@ class Spawned:
 
 
 def send_body(connection, body):
-    for start in range(0, len(body), 60000):
-        connection.sendall(record(STDIN, body[start:start + 60000]))
-    connection.sendall(record(STDIN))
+    _send(connection, STDIN, body)
+
+
+def _send(connection, kind, content):
+    for start in range(0, len(content), 60000):
+        connection.sendall(record(kind, content[start:start + 60000]))
+    connection.sendall(record(kind))
 
 
 def _exactly(connection, size):

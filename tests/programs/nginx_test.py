@@ -182,7 +182,7 @@ class Owners(unittest.TestCase):
         return Visitor(SERVER).request("GET", path, None, headers or {})
 
     def test_page_needs_an_account(self):
-        for path in "/owner/", "/owner/owner.js", QUERY:
+        for path in "/owner/", "/owner/index.html", "/owner/none", "/owner/x/owner.js", QUERY:
             self.assertEqual(self.ask(path).status, 401)
             self.assertEqual(self.ask(path, login("alice", "wrong")).status, 401)
             self.assertEqual(self.ask(path, login("dave", "dave-secret")).status, 401)
@@ -198,10 +198,23 @@ class Owners(unittest.TestCase):
                              "frame-ancestors 'none'; base-uri 'none'")
             self.assertEqual(reply.get("X-Content-Type-Options"), "nosniff")
             self.assertEqual(reply.get("Cache-Control"), "no-cache")
-
             self.assertEqual(reply.get("Referrer-Policy"), "no-referrer")
             self.assertEqual(reply.get("X-Frame-Options"), "DENY")
             self.assertEqual(reply.get("Cross-Origin-Opener-Policy"), "same-origin")
+
+    def test_parts_of_the_page_are_the_same_for_everybody(self):
+        for part, kind in (("owner.js", "text/javascript; charset=utf-8"),
+                           ("owner.css", "text/css; charset=utf-8"), ("icon.svg", "image/svg+xml")):
+            with open(vs.PAGE + part, "rb") as file:
+                content = file.read()
+            reply = self.ask("/owner/" + part)
+            self.assertEqual((reply.status, reply.get("Content-Type"), reply.body),
+                             (200, kind, content))
+            self.assertIn("script-src 'self'", reply.get("Content-Security-Policy"))
+            # A copy that a browser has kept is asked about, and not sent again.
+            self.assertEqual(reply.get("Cache-Control"), "no-cache")
+            reply = self.ask("/owner/" + part, {"If-None-Match": reply.get("ETag")})
+            self.assertEqual((reply.status, reply.body), (304, b""))
 
     def test_server_that_lets_addresses_in_without_a_password(self):
         for path in "/owner/", QUERY:

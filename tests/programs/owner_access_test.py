@@ -48,7 +48,8 @@ class Access(unittest.TestCase):
             self.assertNotIn(b"<script", reply.body)
 
     def test_nobody_without_an_account(self):
-        for path in "/owner/", "/owner/index.html", "/owner/owner.js", QUERY:
+        for path in ("/owner/", "/owner/index.html", "/owner/none", "/owner/x/owner.js",
+                     "/owner/owner.js.bak", "/owner/owner.js/", QUERY):
             self.assert_asked_for_a_login(path)
             self.assert_asked_for_a_login(path, Remote_User="alice")
             self.assert_asked_for_a_login(path, REMOTE_USER="alice")
@@ -58,6 +59,17 @@ class Access(unittest.TestCase):
                                ("dave", "dave-secret"), ("www-data", "")):  # dave's has expired
             self.assert_asked_for_a_login("/owner/", **login(name, password))
             self.assert_asked_for_a_login(QUERY, **login(name, password))
+
+    def test_parts_of_the_page_are_the_same_for_everybody(self):
+        for part in "owner.js", "owner.css", "icon.svg":
+            with self.subTest(part=part):
+                with open(vs.PAGE + part, "rb") as file:
+                    content = file.read()
+                reply = self.ask("/owner/" + part)
+                self.assertEqual((reply.status, reply.body), (200, content))
+                # A copy that a browser has kept is asked about, and not sent again.
+                reply = self.ask("/owner/" + part, If_None_Match=reply.get("ETag"))
+                self.assertEqual((reply.status, reply.body), (304, b""))
 
     def test_ways_around_the_folders_name(self):
         for path in ("//webapi/entry.cgi", "/webapi//entry.cgi", "/%77ebapi/entry.cgi",

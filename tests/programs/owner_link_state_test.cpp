@@ -5,7 +5,9 @@
 #include <tuvosharing/entry_db.h>
 #include <tuvosharing/sharing_db.h>
 
+#include <algorithm>
 #include <map>
+#include <string>
 #include <vector>
 
 namespace owner {
@@ -130,6 +132,93 @@ TEST_F(OwnerLinkStateRows, RowWithoutValuesIsOfTheStateThatItLoadsWith) {
        {LinkState::kDisabled, LinkState::kExpired, LinkState::kUsedUp, LinkState::kNotYet}) {
     EXPECT_TRUE(Rows(other).empty()) << StateText(other);
   }
+}
+
+// Whatever other programs put into the columns, the condition is of one mind with the record.
+class OwnerLinkStateOddRows : public OwnerLinkStateRows {
+ protected:
+  // Rows with each of the values in the column, and with 5 in `other` if one is named.
+  void Fill(const std::string& column, const std::string& other) {
+    for (const char* value : {"NULL",
+                              "''",
+                              "'soon'",
+                              "'5x'",
+                              "' 7'",
+                              "'-3x'",
+                              "'+4x'",
+                              "'- 4'",
+                              "1.5",
+                              "1e300",
+                              "-1e300",
+                              "x'3578'",
+                              "x''",
+                              "x'00'",
+                              "CAST(x'31003132' AS TEXT)",
+                              "'0x10'",
+                              "'1e3x'",
+                              "2147483647",
+                              "2147483648",
+                              "3000000000",
+                              "-3000000000",
+                              "9223372036854775807",
+                              "'99999999999999999999999x'",
+                              "'-99999999999999999999999x'",
+                              "'1700000005x'",
+                              "1700000005.5",
+                              "1699999999.5",
+                              "0",
+                              "1",
+                              "2",
+                              "'1 '",
+                              "'true'"}) {
+      ASSERT_TRUE(db_.Execute("INSERT INTO entry (hash, project_name, owner_uid, data, " + column +
+                              (other.empty() ? "" : ", " + other) +
+                              ") VALUES (hex(randomblob(8)), 'album', 2001, '" +
+                              R"({"app":{},"private_data":{},"protect_type":"none"})" + "', " +
+                              value + (other.empty() ? "" : ", 5") + ")"))
+          << value;
+    }
+  }
+};
+
+TEST_F(OwnerLinkStateOddRows, ClausesReadColumnsAsTheRecordsDo) {
+  Fill("enabled", "");
+  Fill("start_at", "");
+  Fill("expire_at", "");
+  Fill("use_count", "expire_times");
+  Fill("expire_times", "use_count");
+  std::map<int, LinkState> expected;
+  std::vector<int> ended;
+  {
+    const EntryDB links(db_);
+    std::vector<Entry> all;
+    ASSERT_TRUE(links.Query(all));
+    for (const Entry& link : all) {
+      expected[link.get_id()] = StateOf(link, kNow);
+      if (StateOf(Entry(link).set_enabled(true), kNow) == LinkState::kExpired ||
+          StateOf(Entry(link).set_enabled(true), kNow) == LinkState::kUsedUp) {
+        ended.push_back(link.get_id());
+      }
+    }
+  }
+  ASSERT_EQ(expected.size(), 5U * 32U);
+  for (const LinkState state : kAll) {
+    const std::vector<int> rows = Rows(state);
+    EXPECT_FALSE(rows.empty()) << StateText(state);
+    for (const auto& [id, its_state] : expected) {
+      EXPECT_EQ(std::count(rows.begin(), rows.end(), id), its_state == state ? 1 : 0)
+          << id << " is " << StateText(its_state) << ", and not " << StateText(state);
+    }
+  }
+  const EntryDB links(db_);
+  links.GetCondition().Where(EndedClause(kNow));
+  std::vector<Entry> found;
+  ASSERT_TRUE(links.Query(found));
+  std::vector<int> ids;
+  for (const Entry& link : found) {
+    ids.push_back(link.get_id());
+  }
+  EXPECT_EQ(ids, ended);
 }
 
 }  // namespace

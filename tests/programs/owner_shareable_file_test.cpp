@@ -2,6 +2,9 @@
 
 #include <fcntl.h>
 #include <gtest/gtest.h>
+#include <sched.h>
+#include <sys/mount.h>
+#include <sys/prctl.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
@@ -144,6 +147,68 @@ TEST_F(OwnerShareableFile, PathsThatAreNotAbsoluteMayNot) {
   ASSERT_EQ(chdir("/"), 0);
 }
 
+// A process of alice's that `prepare`s as root and then sleeps; /proc shows it to her.
+pid_t SleepAsAlice(const std::function<bool()>& prepare) {
+  std::array<int, 2> ready{};
+  EXPECT_EQ(pipe(ready.data()), 0);
+  const pid_t sleeper = fork();
+  if (sleeper == 0) {
+    if (!prepare() || setresgid(2001, 2001, 2001) != 0 || setresuid(2001, 2001, 2001) != 0 ||
+        prctl(PR_SET_DUMPABLE, 1) != 0 || write(ready[1], "x", 1) != 1) {
+      _exit(1);
+    }
+    pause();
+    _exit(0);
+  }
+  char byte = 0;
+  close(ready[1]);
+  EXPECT_EQ(read(ready[0], &byte, 1), 1) << "not prepared";
+  close(ready[0]);
+  return sleeper;
+}
+
+void End(pid_t process) {
+  kill(process, SIGKILL);
+  waitpid(process, nullptr, 0);
+}
+
+// Everybody may have a namespace, in which the path of somebody else's file is one's own.
+TEST_F(OwnerShareableFile, FileOfAnotherMountNamespaceMayNot) {
+  fs::create_directories("/tmp/share/bobs");
+  Make("/tmp/share/bobs/secret", 2002, 0600);
+  const pid_t sleeper = SleepAsAlice([] {
+    if (unshare(CLONE_NEWNS) != 0 ||
+        mount("none", "/tmp/share/bobs", "tmpfs", 0, "mode=0755") != 0) {
+      return false;
+    }
+    Make("/tmp/share/bobs/secret", 2001, 0600);
+    return true;
+  });
+  const std::string root = "/proc/" + std::to_string(sleeper) + "/root";
+  ASSERT_TRUE(fs::exists(root + "/tmp/share/bobs/secret"));
+  EXPECT_EQ(Check(root + "/tmp/share/bobs/secret"), FileAnswer::kNotReadable);
+  EXPECT_EQ(resolved_, "");
+  // What is the same file there and here may be named so.
+  EXPECT_EQ(Check(root + "/tmp/share/alices"), FileAnswer::kMay);
+  EXPECT_EQ(resolved_, "/tmp/share/alices");
+  End(sleeper);
+}
+
+// Its path is told with " (deleted)" behind it, and somebody else may have a file of that name.
+TEST_F(OwnerShareableFile, DeletedFileThatIsStillOpenMayNot) {
+  const pid_t sleeper = SleepAsAlice([] {
+    Make("/tmp/share/gone", 2001, 0600);
+    const int fd = open("/tmp/share/gone", O_RDONLY);
+    return fd >= 0 && dup2(fd, 60) == 60 && unlink("/tmp/share/gone") == 0;
+  });
+  const std::string open_file = "/proc/" + std::to_string(sleeper) + "/fd/60";
+  EXPECT_EQ(Check(open_file), FileAnswer::kNotReadable);
+  Make("/tmp/share/gone (deleted)", 2002, 0600);
+  EXPECT_EQ(Check(open_file), FileAnswer::kNotReadable);
+  EXPECT_EQ(resolved_, "");
+  End(sleeper);
+}
+
 TEST_F(OwnerShareableFile, WithoutFoldersNothingMay) {
   folders_.clear();
   EXPECT_EQ(Check("/tmp/share/open"), FileAnswer::kOutside);
@@ -209,11 +274,6 @@ pid_t Lease(const std::string& path, const std::function<void()>& then) {
   return holder;
 }
 
-void End(pid_t holder) {
-  kill(holder, SIGKILL);
-  waitpid(holder, nullptr, 0);
-}
-
 TEST_F(OwnerShareableFile, LeaseThatIsNotGivenBackIsNotWaitedForLong) {
   const pid_t holder = Lease("/tmp/share/alices", [] {});
   const auto start = std::chrono::steady_clock::now();
@@ -223,20 +283,26 @@ TEST_F(OwnerShareableFile, LeaseThatIsNotGivenBackIsNotWaitedForLong) {
   EXPECT_EQ(Check("/tmp/share/alices"), FileAnswer::kMay);
 }
 
-// Stops every other process of alice's that runs this test: the one that looks at her file.
-void StopTheLook() {
+// Stops the process of alice's that looks at her file: a child's child of `test`. Others that have
+// its name are another run's.
+void StopTheLook(pid_t test) {
+  const auto parent_in = [](const std::string& text) {
+    const size_t at = text.find("\nPPid:\t");
+    return at == std::string::npos ? "" : text.substr(at + 7, text.find('\n', at + 1) - at - 7);
+  };
+  const auto status_of = [](const std::string& process) {
+    std::ifstream status("/proc/" + process + "/status");
+    return std::string(std::istreambuf_iterator<char>(status), std::istreambuf_iterator<char>());
+  };
   for (;;) {
     for (const fs::directory_entry& entry : fs::directory_iterator("/proc")) {
       const std::string name = entry.path().filename();
       if (name.find_first_not_of("0123456789") != std::string::npos) {
         continue;
       }
-      std::ifstream status(entry.path() / "status");
-      const std::string text((std::istreambuf_iterator<char>(status)),
-                             std::istreambuf_iterator<char>());
-      if (name != std::to_string(getpid()) &&
-          text.find("Name:\towner_shareabl") != std::string::npos &&
-          text.find("Uid:\t2001\t2001\t2001\t2001") != std::string::npos) {
+      const std::string text = status_of(name);
+      if (text.find("Uid:\t2001\t2001\t2001\t2001") != std::string::npos &&
+          parent_in(status_of(parent_in(text))) == std::to_string(test)) {
         kill(std::stoi(name), SIGSTOP);
         return;
       }
@@ -247,7 +313,7 @@ void StopTheLook() {
 // By a process that is not root, but can become it.
 TEST_F(OwnerShareableFile, LookThatItsOwnerStopsIsEndedAndLogged) {
   tuvo_test::SyslogListener log;
-  const pid_t holder = Lease("/tmp/share/alices", StopTheLook);
+  const pid_t holder = Lease("/tmp/share/alices", [test = getpid()] { StopTheLook(test); });
   EXPECT_EQ(tuvo_test::RunInChildAs(
                 {33, 33, 0, 33, 33, 33},
                 [this] {

@@ -9,6 +9,9 @@
 #include <array>
 #include <stdexcept>
 #include <string>
+#include <vector>
+
+#include "support/syslog_listener.h"
 
 namespace owner {
 namespace {
@@ -202,6 +205,85 @@ TEST_F(OwnerTransaction, ConnectionIsFreeAgainAfterAllOfIt) {
   InTransaction(db_, [](EntryDB&) { return Fault(Error::kConflict, "x"); });
   EXPECT_TRUE(db_.Begin());
   EXPECT_TRUE(db_.Commit());
+}
+
+// The connection keeps its last error however much goes well behind it.
+TEST_F(OwnerTransaction, LockedFileOfFormerTimesDecidesNothing) {
+  {
+    SharingDB other(kPath);
+    ASSERT_TRUE(db_.Begin());
+    ASSERT_TRUE(db_.Execute("SELECT * FROM token"));
+    ASSERT_TRUE(other.Execute("INSERT INTO token VALUES (NULL, NULL, NULL, 1)"));
+    EXPECT_FALSE(db_.Execute("DELETE FROM token"));  // stale
+    ASSERT_TRUE(db_.Execute("ROLLBACK"));
+    ASSERT_TRUE(db_.Execute("DELETE FROM token"));
+  }
+  ASSERT_NE(db_.GetLastError().find("locked"), std::string::npos);
+  for (const Locking locking : {Locking::kWhenWriting, Locking::kFirst}) {
+    int runs = 0;
+    const MaybeProblem problem = InTransaction(
+        db_,
+        [&runs](EntryDB&) {
+          ++runs;
+          return InternalFault();
+        },
+        locking);
+    ASSERT_TRUE(problem);
+    EXPECT_EQ(problem->error, Error::kInternal);
+    EXPECT_EQ(runs, 1);
+  }
+}
+
+TEST_F(OwnerTransaction, FileThatIsLockedOnceMoreIsLockedAllTheSame) {
+  Entry link = Link("aaa");
+  ASSERT_TRUE(EntryDB(db_).Create(link));
+  for (int round = 0; round < 2; ++round) {
+    int runs = 0;
+    EXPECT_EQ(InTransaction(db_,
+                            [&](EntryDB& links) {
+                              Entry read;
+                              EXPECT_TRUE(links.GetById(link.get_id(), read));
+                              if (++runs == 1) {
+                                WriteElsewhere();
+                              }
+                              return links.Update(read) ? MaybeProblem() : InternalFault();
+                            }),
+              std::nullopt);
+    EXPECT_EQ(runs, 2);
+    // As the first of the two attempts has left it.
+    ASSERT_TRUE(db_.Begin());
+    ASSERT_TRUE(db_.Execute("SELECT * FROM token"));
+    WriteElsewhere();
+    EXPECT_FALSE(db_.Execute("DELETE FROM token"));
+    ASSERT_TRUE(db_.Execute("ROLLBACK"));
+    ASSERT_NE(db_.GetLastError().find("locked"), std::string::npos);
+  }
+}
+
+TEST_F(OwnerTransaction, FailureOfAStatementIsLogged) {
+  tuvo_test::SyslogListener listener;
+  InTransaction(db_, [](EntryDB&) { return InternalFault(); });  // no statement's
+  InTransaction(db_, [](EntryDB&) { return Fault(Error::kConflict, "x"); });
+  InTransaction(db_, [this](EntryDB&) {
+    return db_.Execute("SELECT missing FROM entry") ? MaybeProblem() : InternalFault();
+  });
+  const std::vector<std::string> lines = listener.TakeTexts();
+  ASSERT_EQ(lines.size(), 1U);
+  EXPECT_NE(lines[0].find("the database failed: no such column: missing"), std::string::npos)
+      << lines[0];
+}
+
+TEST_F(OwnerTransaction, ReasonOfATransactionThatSqliteHasTakenBackIsLogged) {
+  tuvo_test::SyslogListener listener;
+  InTransaction(db_, [this](EntryDB&) {
+    // What a full disk does as well.
+    EXPECT_TRUE(db_.Execute("INSERT INTO entry (hash) VALUES ('taken')"));
+    return db_.Execute("INSERT OR ROLLBACK INTO entry (hash) VALUES ('taken')") ? MaybeProblem()
+                                                                                : InternalFault();
+  });
+  const std::vector<std::string> lines = listener.TakeTexts();
+  ASSERT_EQ(lines.size(), 1U);
+  EXPECT_NE(lines[0].find("UNIQUE constraint failed: entry.hash"), std::string::npos) << lines[0];
 }
 
 TEST_F(OwnerTransaction, ConnectionThatIsNotGoodFailsInside) {

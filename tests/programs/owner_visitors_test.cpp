@@ -124,5 +124,50 @@ TEST_F(OwnerVisitors, ListIsBoundedAndTheTotalIsNot) {
   EXPECT_EQ(total_, 5);
 }
 
+TEST_F(OwnerVisitors, SigningOutEndsTheAdmissionsOfThatLinkAlone) {
+  const Entry other = MakeLink();
+  Admit(link_, "192.0.2.1", kNobody, 500);
+  Admit(link_, "192.0.2.2", 2002, 500);
+  Admit(link_, "192.0.2.3", kNobody, -500);
+  Admit(other, "192.0.2.1", kNobody, 500);
+  Entry found;
+  int count = -1;
+  EXPECT_EQ(SignOutVisitors(db_, {link_.get_id(), ""}, 2001U, now_, &found, &count), std::nullopt);
+  EXPECT_EQ(found.get_hash(), link_.get_hash());
+  EXPECT_EQ(count, 2);
+  EXPECT_TRUE(List().empty());
+  int left = 0;
+  ASSERT_TRUE(TokenDB(db_).Count(left));
+  EXPECT_EQ(left, 1);  // the expired one is gone too
+}
+
+TEST_F(OwnerVisitors, NobodySignsOutTheVisitorsOfSomebodyElsesLink) {
+  Admit(link_, "192.0.2.1", kNobody, 500);
+  Entry found;
+  int count = -1;
+  const MaybeProblem problem =
+      SignOutVisitors(db_, {link_.get_id(), ""}, 2002U, now_, &found, &count);
+  ASSERT_TRUE(problem);
+  EXPECT_EQ(problem->error, Error::kNoSuchLink);
+  EXPECT_EQ(List().size(), 1U);
+}
+
+TEST_F(OwnerVisitors, SigningOutThatFailsHalfWayEndsNobodysAdmission) {
+  Admit(link_, "192.0.2.1", kNobody, 500);
+  Admit(link_, "192.0.2.2", kNobody, 400);
+  ASSERT_TRUE(
+      db_.Execute("CREATE TEMP TRIGGER fail BEFORE DELETE ON token WHEN "
+                  "OLD.timeout = " +
+                  std::to_string(now_ + 400) + " BEGIN SELECT RAISE(ABORT, 'no'); END"));
+  Entry found;
+  int count = -1;
+  const MaybeProblem problem =
+      SignOutVisitors(db_, {link_.get_id(), ""}, std::nullopt, now_, &found, &count);
+  ASSERT_TRUE(db_.Execute("DROP TRIGGER fail"));
+  ASSERT_TRUE(problem);
+  EXPECT_EQ(problem->error, Error::kInternal);
+  EXPECT_EQ(List().size(), 2U);
+}
+
 }  // namespace
 }  // namespace owner

@@ -235,14 +235,30 @@ class Admission(VisitorTest):
         self.assertEqual(Visitor(SERVER, "127.0.0.27").post(
             path_of(link), {"password": "secret"}).status, 303)
 
-    def test_second_link_in_the_same_session(self):
+    def test_second_link_leaves_the_first_open(self):
         first, second = make_file_link(FILE), make_file_link(FILE)
         visitor = admitted(first)
         session_id = visitor.session_id
         self.assert_form(visitor.get(path_of(second)), 403)
-        self.assertEqual(visitor.post(path_of(second)).session_id(), session_id)
+        self.assertNotEqual(visitor.post(path_of(second)).session_id(), session_id)
         self.assertEqual(visitor.get(path_of(first)).status, 200)
         self.assertEqual(visitor.get(path_of(second)).status, 200)
+
+    def test_second_link_leaves_the_account_of_the_first(self):
+        first = make_file_link(FILE, protect_type="user", protect_users=["alice"])
+        second = make_file_link(FILE)
+        visitor = Visitor(SERVER)
+        visitor.post(path_of(first), {"zor_username": "alice", "zor_password": "alice-secret"})
+        visitor.post(path_of(second))
+        self.assertEqual(visitor.get(path_of(first)).status, 200)
+
+    def test_link_opened_again_is_open_once(self):
+        link = make_file_link(FILE)
+        visitor = admitted(link)
+        visitor.post(path_of(link))
+        self.assertEqual(visitor.get(path_of(link)).status, 200)
+        self.assertEqual(sql("SELECT count(*) FROM token WHERE entry_id = (SELECT id FROM entry "
+                             "WHERE hash = ?)", link), [(1,)])
 
     def test_forms_of_other_sites_are_refused(self):
         link = make_file_link(FILE)

@@ -16,6 +16,7 @@ PROGRAM = "/usr/tuvo/bin/sharing.cgi"
 PLAIN_PROGRAM = "/usr/tuvo/bin/plain.cgi"  # the same without the set-user-id bit
 OWNERS_PROGRAM = "/usr/tuvo/bin/entry.cgi"
 DATABASE = "/usr/tuvo/etc/private/session/sharing.db"
+PAGE = "/usr/tuvo/share/tuvosharing/web/"
 WWW_DATA = 33
 SYSTEM = 1
 LOG_ERR = 3

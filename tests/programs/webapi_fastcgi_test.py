@@ -31,8 +31,12 @@ def processes():
 
 def memory(pid):
     """Kilobytes that are in memory."""
+    return figure(pid, "VmRSS")
+
+
+def figure(pid, name):
     with open(f"/proc/{pid}/status") as status:
-        return int(re.search(r"VmRSS:\s+(\d+) kB", status.read()).group(1))
+        return int(re.search(name + r":\s+(\d+) kB", status.read()).group(1))
 
 
 class FastCgiTest(unittest.TestCase):
@@ -151,6 +155,28 @@ class Requests(FastCgiTest):
             self.assertEqual(children.read(), "")
         if not vs.is_sanitized():
             self.assertLess(memory(self.process) - before, 512)
+
+    def test_large_lists_do_not_take_much_memory(self):
+        """As trees, the values of these links take 300 MB."""
+        def fill(values):
+            vs.sql("DELETE FROM entry")
+            API.call("bob", "create", project_name="x", app={"values": values})
+            vs.sql("WITH RECURSIVE n(i) AS (SELECT 1 UNION ALL SELECT i + 1 FROM n WHERE i < 299) "
+                   "INSERT INTO entry SELECT NULL, hash || '-' || i, project_name, enabled, owner_uid, "
+                   "start_at, expire_at, expire_times, use_count, auto_gc, data FROM entry, n")
+
+        fill([1] * 9990)
+        answer = API.call("bob", "list", limit=500)
+        self.assertEqual(len(answer.data["links"]), 300)
+        self.assertEqual(answer.data["links"][299]["app"]["values"], [1] * 9990)
+        fill(["x" * 100] * 600)
+        answer = API.call("bob", "list", limit=500)
+        self.assertEqual((answer.code, answer.field), (203, "limit"))
+        answer = API.call("bob", "list", limit=100, offset=200)
+        self.assertEqual(len(answer.data["links"]), 100)
+        if not vs.is_sanitized():
+            self.assertLess(figure(self.process, "VmHWM"), 128 * 1024)
+            self.assertLess(memory(self.process), 96 * 1024)
 
     def idle_descriptors(self):
         """How many are open once the last request's connection is closed."""

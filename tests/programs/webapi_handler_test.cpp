@@ -30,7 +30,7 @@ Call CallOf(const std::string& method) {
 }
 
 int CodeOf(const Call& call) {
-  const Json::Value answer = Handle(call);
+  const Json::Value answer = Handle(call).document;
   return IsSuccess(answer) ? 1 : answer["error"]["code"].asInt();
 }
 
@@ -132,7 +132,7 @@ void RunOutOfMemory(const std::function<Call()>& make_call) {
     const Call call = make_call();
     allocations_left = attempt;
     try {
-      const Json::Value answer = Handle(call);
+      const Json::Value answer = Handle(call).document;
       enough = allocations_left >= 0;
       allocations_left = -1;
       EXPECT_TRUE(IsSuccess(answer) || (!enough && answer["error"]["code"].asInt() >= 100))
@@ -158,10 +158,10 @@ TEST_F(WebapiHandler, LackOfMemoryIsAFailureOrThrownOn) {
     Handle(CreateCall());
     return CallOf("list");
   });
-  for (const char* method : {"set", "get", "sessions", "delete"}) {
+  for (const char* method : {"set", "get", "sessions", "sign_out", "delete"}) {
     RunOutOfMemory([method] {
       Call call = CallOf(method);
-      call.arguments["id"] = Handle(CreateCall())["data"]["link"]["id"];
+      call.arguments["id"] = Handle(CreateCall()).document["data"]["link"]["id"];
       return call;
     });
   }
@@ -169,7 +169,7 @@ TEST_F(WebapiHandler, LackOfMemoryIsAFailureOrThrownOn) {
 
 TEST_F(WebapiHandler, DatabaseThatCannotBeUsedIsAFailure) {
   EXPECT_EQ(0, tuvo_test::RunInChildAs(tuvo_test::kNobody, [] {
-              for (const char* method : {"get", "delete", "sessions", "set"}) {
+              for (const char* method : {"get", "delete", "sessions", "sign_out", "set"}) {
                 Call call = CallOf(method);
                 call.arguments["id"] = 1;
                 EXPECT_EQ(CodeOf(call), 100) << method;

@@ -390,13 +390,13 @@ class Settings(Methods):
 class Ownership(Methods):
     def test_others_links_do_not_exist(self):
         link = self.create("bob")
-        for method, arguments in (("get", {}), ("sessions", {}), ("delete", {}),
+        for method, arguments in (("get", {}), ("sessions", {}), ("sign_out", {}), ("delete", {}),
                                   ("set", {"protect_title": "x"})):
             self.assertEqual(self.refused(205, "", "alice", method, id=link["id"], **arguments)
                              .document,
                              self.refused(205, "", "alice", method, id=2147483647, **arguments)
                              .document)
-        for method in "get", "sessions", "delete":
+        for method in "get", "sessions", "sign_out", "delete":
             self.refused(205, "", "alice", method, hash=link["hash"])
         self.assertEqual(self.done("bob", "get", id=link["id"])["link"], link)
 
@@ -666,6 +666,76 @@ class Sessions(Methods):
         self.refused(205, "", "alice", "sessions", hash="no-such")
 
 
+class SignOut(Methods):
+    def setUp(self):
+        super().setUp()
+        for table in "token", "session":
+            self.addCleanup(sql, "DELETE FROM " + table)
+
+    def admit(self, link, *seconds):
+        """Visitors of a link whose admission ends so many seconds from now."""
+        for offset in seconds:
+            row = sql("SELECT ifnull(max(id), 0) + 1 FROM session")[0][0]
+            end = int(time.time()) + offset
+            sql("INSERT INTO session VALUES (?,?,4294967295,'192.0.2.1',?)", row, f"s{row}", end)
+            sql("INSERT INTO token VALUES (NULL,?,?,?)", link["id"], row, end)
+
+    def admitted(self, link):
+        return sql("SELECT count(*) FROM token WHERE entry_id=?", link["id"])[0][0]
+
+    def test_everybody_of_one_link(self):
+        other = self.create()
+        for name in "id", "hash":
+            self.admit(self.kept, 60, 3600, -60)
+            self.admit(other, 60)
+            self.assertEqual(self.done("alice", "sign_out", **{name: self.kept[name]}),
+                             {"signed_out": 2})  # the third had ended by itself
+            self.assertEqual(self.admitted(self.kept), 0)
+            self.assertEqual(self.done("alice", "sessions", id=self.kept["id"])["total"], 0)
+        self.assertEqual(self.admitted(other), 2)
+        self.assertEqual(self.done("alice", "get", id=self.kept["id"])["link"], self.kept)
+        self.assertEqual(sql("SELECT count(*) FROM session"), [(8,)])  # which other links may need
+
+    def test_nobody_is_no_fault(self):
+        self.assertEqual(self.done("alice", "sign_out", id=self.kept["id"]), {"signed_out": 0})
+
+    def test_others_visitors_stay(self):
+        self.admit(self.kept, 60)
+        self.refused(205, "", "bob", "sign_out", id=self.kept["id"])
+        self.assertEqual(self.admitted(self.kept), 1)
+        self.assertEqual(self.done("carol", "sign_out", id=self.kept["id"]), {"signed_out": 1})
+
+    def test_needs_a_name(self):
+        self.refused(201, "id", "alice", "sign_out")
+        self.refused(208, "hash", "alice", "sign_out", id=self.kept["id"], hash=self.kept["hash"])
+        self.refused(205, "", "alice", "sign_out", hash="no-such")
+
+    def test_another_password_signs_out(self):
+        for settings in {"protect_password": "first"}, {"protect_password": "second"}:
+            self.admit(self.kept, 60)
+            self.done("alice", "set", id=self.kept["id"], **settings)
+            self.assertEqual(self.admitted(self.kept), 0, settings)
+
+    def test_other_changes_do_not(self):
+        self.done("alice", "set", id=self.kept["id"], protect_password="tea")
+        self.admit(self.kept, 60)
+        for settings in ({"protect_title": "x"}, {"enabled": False}, {"hash": "other-hash"},
+                         {"protect_users": ["bob"]}, {"protect_type": "none"}):
+            self.done("alice", "set", id=self.kept["id"], **settings)
+            self.assertEqual(self.admitted(self.kept), 1, settings)
+        self.done("alice", "set", id=self.kept["id"], protect_type="password")  # the former one
+        self.assertEqual(self.admitted(self.kept), 0)
+
+    def test_password_that_is_refused_signs_nobody_out(self):
+        self.admit(self.kept, 60)
+        self.refused(203, "protect_password", "alice", "set", id=self.kept["id"],
+                     protect_password="")
+        self.create(hash="taken")
+        self.refused(204, "hash", "alice", "set", id=self.kept["id"], protect_password="x",
+                     hash="taken")
+        self.assertEqual(self.admitted(self.kept), 1)
+
+
 class Info(Methods):
     def query(self, who):
         answer = self.call(who, "query", api=ws.INFO)
@@ -693,7 +763,7 @@ class Info(Methods):
         methods = apis[ws.LINK]["methods"]
         self.assertEqual({name: method["changes"] for name, method in methods.items()},
                          {"create": True, "get": False, "list": False, "set": True, "delete": True,
-                          "delete_expired": True, "sessions": False})
+                          "delete_expired": True, "sessions": False, "sign_out": True})
         self.assertEqual([name for name, argument in methods["create"]["arguments"].items()
                           if argument["needed"]], ["project_name"])
         self.assertEqual(methods["set"]["arguments"]["id"], {"type": "integer", "needed": True})

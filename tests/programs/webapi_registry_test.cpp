@@ -46,7 +46,7 @@ TEST(WebapiRegistry, ApiThenVersionThenMethod) {
 }
 
 TEST(WebapiRegistry, WhatChangesSomethingSaysSo) {
-  for (const char* method : {"create", "set", "delete", "delete_expired"}) {
+  for (const char* method : {"create", "set", "delete", "delete_expired", "sign_out"}) {
     EXPECT_TRUE(Of(method)->changes) << method;
   }
   for (const char* method : {"get", "list", "sessions"}) {

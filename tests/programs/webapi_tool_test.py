@@ -5,6 +5,7 @@ import json
 import os
 import re
 import resource
+import select
 import shutil
 import signal
 import stat
@@ -22,6 +23,12 @@ START = ("--exec", "api=TUVO.Sharing.Link", "version=1")
 PROJECT = None
 # Of a build with sanitizers: the leak check cannot look into a process of mixed ids.
 NOTHING = {"ASAN_OPTIONS": "detect_leaks=0"}
+
+
+def root_may_lift_limits():
+    """Not in every container: whether the capability CAP_SYS_RESOURCE can be had."""
+    with open("/proc/self/status") as status:
+        return int(re.search(r"CapBnd:\t(\w+)", status.read()).group(1), 16) >> 24 & 1 == 1
 
 
 def code(*arguments, who="alice", **options):
@@ -76,7 +83,8 @@ class CommandLine(unittest.TestCase):
                                   "protect_users=" + text), wanted, text)
         for text, wanted in (('{"a": 1}', 1), ("{}", 1), ("[]", 202), ("", 202), ("null", 202),
                              ('{"a":1,"a":2}', 202), ("{'a':1}", 202), ('{"a":1}//', 202),
-                             ('{"x":' * 32 + "1" + "}" * 32, 1), ('{"x":' * 40 + "1" + "}" * 40, 202)):
+                             ('{"x":' * 32 + "1" + "}" * 32, 1), ('{"x":' * 33 + "1" + "}" * 33, 203),
+                             ('{"x":' * 34 + "1" + "}" * 34, 202), ('{"x":' * 40 + "1" + "}" * 40, 202)):
             self.assertEqual(code(*START, "method=create", "project_name=x", "app=" + text), wanted,
                              text)
 
@@ -182,30 +190,77 @@ class Surroundings(unittest.TestCase):
         self.assertEqual(vs.sql("PRAGMA integrity_check"), [("ok",)])
         self.assertEqual(len(vs.sql("SELECT 1 FROM entry WHERE project_name='closed'")), 1)
 
-    def test_limits_that_the_caller_sets(self):
-        def limited(which, value):
-            return subprocess.run([ws.TOOL, *START, "method=create", "project_name=limited"],
+    def test_standard_descriptors_that_root_closes(self):
+        """The system's loader opens them for set-user-id programs, but not for those of root."""
+        answers = []
+        for closed in ">&-", "<&- >&-", "<&- >&- 2>&-":
+            script = f'exec {ws.TOOL} --exec api=TUVO.Sharing.Link version=1 method=create ' \
+                     f'project_name=by-root {closed}'
+            with vs.SystemLog() as log:
+                done = subprocess.run(["/bin/sh", "-c", script], env=NOTHING)
+            self.assertEqual(done.returncode, 1)  # nobody has seen the answer
+            self.assertEqual(len(log.lines), 1, log.lines)
+            answers += ws.events(log)
+        self.assertEqual([event["result"] for event in answers], ["1"] * 3)
+        hashes = vs.sql("SELECT hash FROM entry WHERE project_name='by-root'")
+        self.assertEqual(len(hashes), 3)
+
+    def test_nothing_that_is_printed_gets_into_the_log(self):
+        """Of any program that root starts with its standard output closed: the connection to the
+        system log must not take its place."""
+        link = API.call("root", "create", project_name="x").data["link"]["hash"]
+        cgi = {"GATEWAY_INTERFACE": "CGI/1.1", "REMOTE_ADDR": "192.0.2.7", "REQUEST_METHOD": "GET",
+               "QUERY_STRING": "api=TUVO.Sharing.Link&version=1&method=get&hash=" + link,
+               "REMOTE_USER": "root", "PATH_INFO": f"/{link}/none", "HTTP_HOST": "nas.example.org"}
+        for program, environment in (
+                (f"{ws.TOOL} --exec api=TUVO.Sharing.Link version=1 method=set id=x hash={link}", {}),
+                (f"/usr/tuvo/bin/tuvosharing show {link}", {}),
+                (f"/usr/tuvo/bin/tuvosharing disable {link}", {}),
+                (f"/usr/tuvo/bin/tuvosharingurl x 0 0 '' {link}", {}),
+                (ws.ENTRY, cgi), (ws.ENTRY, {}), (vs.PROGRAM, cgi), (vs.PROGRAM, {})):
+            for closed in ">&-", "<&- >&- 2>&-":
+                with vs.SystemLog() as log:
+                    subprocess.run(["/bin/sh", "-c", f"exec {program} {closed}"], cwd="/",
+                                   env={**NOTHING, **environment}, stderr=subprocess.DEVNULL)
+                for line in log.lines:
+                    self.assertRegex(line, r"^<\d+>\w+ +\d+ [\d:]+ [\w.]+(\[\d+\])?: ", program)
+                    self.assertNotIn(link, line)
+
+    def limited(self, *limits):
+        """A creation under these limits, and whether the log knows of what it made."""
+        before = vs.sql("SELECT COUNT(*) FROM entry")[0][0]
+        with vs.SystemLog() as log:
+            done = subprocess.run([ws.TOOL, *START, "method=create", "project_name=limited"],
                                   user=2001, group=2001, extra_groups=[], stdout=subprocess.PIPE,
                                   stderr=subprocess.PIPE, env=NOTHING, timeout=60,
-                                  preexec_fn=lambda: resource.setrlimit(which, (value, value)))
+                                  preexec_fn=lambda: [resource.setrlimit(which, (value, value))
+                                                      for which, value in limits])
+        made = vs.sql("SELECT COUNT(*) FROM entry")[0][0] - before
+        noted = [event for event in ws.events(log) if event["result"] == "1"]
+        self.assertEqual(len(noted), made, limits)
+        self.assertEqual(vs.sql("PRAGMA integrity_check"), [("ok",)])
+        if done.returncode == 0:
+            self.assertTrue(json.loads(done.stdout)["success"])
+            self.assertEqual(made, 1)
+        return done.returncode
 
-        for which, values in ((resource.RLIMIT_FSIZE, (0, 4096, 65536)),
-                              (resource.RLIMIT_NOFILE, (*range(3, 16), 24, 31, 32, 33, 40)),
-                              (resource.RLIMIT_AS, (30 << 20, 40 << 20)),
-                              (resource.RLIMIT_NPROC, (0,))):
-            for value in values:
-                before = vs.sql("SELECT COUNT(*) FROM entry")[0][0]
-                with vs.SystemLog() as log:
-                    done = limited(which, value)
-                made = vs.sql("SELECT COUNT(*) FROM entry")[0][0] - before
-                if done.returncode == 0:
-                    self.assertTrue(json.loads(done.stdout)["success"])
-                    self.assertEqual(made, 1)
-                if done.returncode == 0 or which == resource.RLIMIT_NOFILE:
-                    done_events = [event for event in ws.events(log) if event["result"] == "1"]
-                    self.assertEqual(len(done_events), made, (which, value))
-                self.assertEqual(vs.sql("PRAGMA integrity_check"), [("ok",)])
+    def test_limits_that_the_caller_sets(self):
+        for value in (*range(3, 16), 24, 31, 32, 33, 40):
+            self.limited((resource.RLIMIT_NOFILE, value))
+        self.limited((resource.RLIMIT_NPROC, 0))
         self.assertTrue(API.call("alice", "create", project_name="x").ok)
+
+    def test_limits_that_it_takes_back(self):
+        for which, values in ((resource.RLIMIT_FSIZE, (0, 4096, 65536)),
+                              (resource.RLIMIT_DATA, (1 << 20, 4 << 20)),
+                              (resource.RLIMIT_STACK, (256 << 10, 1 << 20))):
+            for value in values:
+                status = self.limited((which, value))
+                if root_may_lift_limits():
+                    self.assertEqual(status, 0, (which, value))
+        # Too small for the program's own code to be loaded.
+        for value in 10 << 20, 40 << 20:
+            self.limited((resource.RLIMIT_AS, value))
 
     def test_few_descriptors_by_the_soft_limit_alone(self):
         hard = resource.getrlimit(resource.RLIMIT_NOFILE)[1]
@@ -227,8 +282,58 @@ class Surroundings(unittest.TestCase):
                             close_fds=False)
         self.assertEqual((done.returncode, len(ws.events(log))), (0, 1))
 
+    def test_timers_of_the_caller_end_nothing(self):
+        """They outlast an exec. However soon they go off: what was made stands in the log."""
+        for timer, number in ((signal.ITIMER_REAL, signal.SIGALRM),
+                              (signal.ITIMER_VIRTUAL, signal.SIGVTALRM),
+                              (signal.ITIMER_PROF, signal.SIGPROF)):
+            with vs.SystemLog() as log:
+                before = vs.sql("SELECT COUNT(*) FROM entry")[0][0]
+                ends = [run_tool("alice", *START, "method=create", "project_name=timed",
+                                 preexec_fn=lambda: signal.setitimer(timer, seconds)).returncode
+                        for seconds in [step / 2000 for step in range(1, 80, 2)]]
+                made = vs.sql("SELECT COUNT(*) FROM entry")[0][0] - before
+            self.assertEqual(len(ws.events(log)), made)
+            self.assertEqual(ends.count(0), made)
+            self.assertLessEqual(set(ends), {0, -number})  # before it has begun
+
+    def test_change_is_noted_before_its_answer_is_made_up(self):
+        """Killed while it waits for the tool that tells the link's address."""
+        tool = "/usr/tuvo/bin/tuvosharingurl"
+        try:
+            row = API.call("alice", "create", project_name="x").data["link"]["id"] + 1
+            os.rename(tool, tool + ".kept")
+            with open(tool, "w") as file:
+                file.write("#!/bin/sh\nkill -KILL $PPID\n")
+            os.chmod(tool, 0o755)
+            with vs.SystemLog() as log:
+                for method in ("create", "project_name=killed"), ("set", f"id={row}", "enabled=false"):
+                    done = run_tool("alice", *START, "method=" + method[0], *method[1:])
+                    self.assertEqual(done.returncode, -signal.SIGKILL)
+        finally:
+            os.rename(tool + ".kept", tool)
+        self.assertEqual(vs.sql("SELECT project_name, enabled FROM entry WHERE id=?", row),
+                         [("killed", 0)])
+        self.assertEqual([(event["event"], event["link"], event["result"]) for event in ws.events(log)],
+                         [("create", str(row), "1"), ("set", str(row), "1")])
+
+    def test_caller_that_ignores_its_childrens_ends(self):
+        """What is inherited: a child that has ended could not be waited for."""
+        os.makedirs("/tmp/shared", exist_ok=True)
+        with open("/tmp/shared/open", "w"):
+            pass
+        os.chmod("/tmp/shared/open", 0o644)
+        for who in "alice", "root":
+            done = run_tool(who, *START, "method=create", "project_name=file",
+                            'app={"path": "/tmp/shared/open"}', preexec_fn=lambda:
+                            signal.signal(signal.SIGCHLD, signal.SIG_IGN))
+            answer = ws.answer_of(done.stdout)
+            self.assertTrue(answer.ok, answer)
+            self.assertTrue(answer.data["url"])
+
     def test_caller_cannot_stop_it(self):
-        """A program that is stopped while it writes to the database would stop all others."""
+        """A program that is stopped while it writes to the database would stop all others; one that is
+        ended leaves no line of what it did."""
         reading, writing = os.pipe()
         os.set_blocking(writing, False)
         while True:  # its answer finds no room, and it stays
@@ -238,7 +343,8 @@ class Surroundings(unittest.TestCase):
                 break
         os.set_blocking(writing, True)
         process = subprocess.Popen([ws.TOOL, *START, "method=list"], stdout=writing, user=2001,
-                                   group=2001, extra_groups=[], env=NOTHING, cwd="/")
+                                   group=2001, extra_groups=[], env=NOTHING, cwd="/", preexec_fn=lambda:
+                                   resource.setrlimit(resource.RLIMIT_CPU, (50, 60)))
         try:
             for _ in range(400):
                 with open(f"/proc/{process.pid}/status") as lines:
@@ -256,8 +362,22 @@ class Surroundings(unittest.TestCase):
                                   stderr=subprocess.PIPE)
             self.assertNotEqual(done.returncode, 0)
             self.assertIn(b"not permitted", done.stderr)
-        finally:
+            # What a terminal, and the system in the caller's name, send all the same.
+            for number in (signal.SIGINT, signal.SIGQUIT, signal.SIGHUP, signal.SIGALRM, signal.SIGPROF,
+                           signal.SIGVTALRM, signal.SIGXCPU, signal.SIGXFSZ):
+                process.send_signal(number)
+            with open(f"/proc/{process.pid}/limits") as limits:
+                limit = "unlimited +unlimited" if root_may_lift_limits() else "60 +60 "
+                self.assertRegex(limits.read(), f"Max cpu time +{limit}")
+            os.set_blocking(reading, False)
             os.close(writing)
+            answer = b""
+            for _ in range(400):
+                answer += os.read(reading, 1 << 20) if select.select([reading], [], [], 0.1)[0] else b""
+                if process.poll() is not None:
+                    break
+            self.assertEqual(process.wait(1), 0)
+        finally:
             os.close(reading)
             process.wait(60)
 

@@ -1,0 +1,13 @@
+#include "cli/secrecy.h"
+
+#include <cstring>
+
+namespace cli {
+
+void WipeArguments(int argc, char** argv) {
+  for (int i = 1; i < argc; ++i) {
+    explicit_bzero(argv[i], std::strlen(argv[i]));
+  }
+}
+
+}  // namespace cli

@@ -1,0 +1,29 @@
+#include "owner/visitors.h"
+#include "webapi/database.h"
+#include "webapi/link_api.h"
+#include "webapi/link_name.h"
+#include "webapi/ownership.h"
+
+namespace webapi {
+
+owner::MaybeProblem SignOutMethod(Turn* turn) {
+  owner::LinkName name;
+  if (owner::MaybeProblem problem = ReadLinkName(turn->arguments, &name)) {
+    return problem;
+  }
+  TUVO::sharing::db::BaseDB* db = nullptr;
+  if (owner::MaybeProblem problem = OpenDatabase(&db)) {
+    return problem;
+  }
+  TUVO::sharing::record::Entry link;
+  int count = 0;
+  if (owner::MaybeProblem problem =
+          owner::SignOutVisitors(*db, name, ScopeOf(turn->account), turn->now, &link, &count)) {
+    return problem;
+  }
+  turn->link = link.get_id();
+  turn->data["signed_out"] = count;
+  return std::nullopt;
+}
+
+}  // namespace webapi
