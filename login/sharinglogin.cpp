@@ -151,9 +151,11 @@ bool IsUsedUp(const Entry& entry) {
 class WriteTransaction {
  public:
   explicit WriteTransaction(SharingDB& db)
-      : db_(db), open_(db.Execute("BEGIN IMMEDIATE")), begun_(open_ || IsWithinAnother()) {}
+      : db_(db), open_(Begin()), begun_(open_ || IsWithinAnother()) {}
   ~WriteTransaction() {
-    if (open_) {
+    // Once more: a transaction that a passing fault leaves open would lock everybody out, and take
+    // in all that this process writes from now on.
+    if (open_ && !db_.Execute("ROLLBACK")) {
       db_.Execute("ROLLBACK");
     }
   }
@@ -165,6 +167,15 @@ class WriteTransaction {
   bool Commit() { return !std::exchange(open_, false) || db_.Commit(); }
 
  private:
+  bool Begin() {
+    // The last error may be an earlier statement's, and a switch of identity that fails leaves it.
+    // A statement that the connection itself refuses puts another in its place.
+    if (IsWithinAnother()) {
+      db_.Execute(std::string(1, '\0'));
+    }
+    return db_.Execute("BEGIN IMMEDIATE");
+  }
+
   // What SQLite says to a second BEGIN.
   bool IsWithinAnother() const {
     return db_.GetLastError().find("within a transaction") != std::string::npos;

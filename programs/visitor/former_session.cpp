@@ -4,6 +4,9 @@
 #include <tuvosharing/session_db.h>
 #include <tuvosharing/sharing_db.h>
 
+#include <string>
+#include <utility>
+
 #include "common/client_address.h"
 
 namespace visitor {
@@ -41,16 +44,31 @@ bool MoveAccount(SessionDB& sessions, const Session& from, Session* to) {
   return sessions.Update(*to);
 }
 
+// Taken back unless it was committed, also when memory runs out: left open it would lock everybody
+// out.
+class Transaction {
+ public:
+  explicit Transaction(SharingDB& db) : db_(db), open_(db.Execute("BEGIN IMMEDIATE")) {}
+  ~Transaction() {
+    if (open_) {
+      db_.Execute("ROLLBACK");
+    }
+  }
+  Transaction(const Transaction&) = delete;
+  Transaction& operator=(const Transaction&) = delete;
+
+  bool IsOpen() const { return open_; }
+  bool Commit() { return std::exchange(open_, false) && db_.Commit(); }
+
+ private:
+  SharingDB& db_;
+  bool open_;
+};
+
 bool Move(SharingDB& db, SessionDB& sessions, const Session& from, Session* to) {
-  if (!db.Execute("BEGIN IMMEDIATE")) {
-    return false;
-  }
-  if (MoveTokens(db, from, *to) && MoveAccount(sessions, from, to) && sessions.Delete(from) &&
-      db.Commit()) {
-    return true;
-  }
-  db.Execute("ROLLBACK");  // the commit may have done it already
-  return false;
+  Transaction transaction(db);
+  return transaction.IsOpen() && MoveTokens(db, from, *to) && MoveAccount(sessions, from, to) &&
+         sessions.Delete(from) && transaction.Commit();
 }
 
 }  // namespace

@@ -290,7 +290,6 @@ TEST_F(ManyProcesses, LoseNothingAndNeverFail) {
   Run(std::chrono::seconds(FromEnvironment("TUVO_SECONDS", kUsualSeconds)));
   Tell();
   ExpectNoComplaint();
-  EXPECT_LT(pauses_with_log_, pauses_);
   EXPECT_LT(largest_log_, kLargestLog);
   EXPECT_EQ(0, Wait(Start(kSystem, [] { return SharingDB::Instance().IsGood() ? 0 : 1; })));
   EXPECT_FALSE(IsLogThere());

@@ -102,6 +102,48 @@ TEST_F(EveryIdentityCall, OfACheck) {
   EXPECT_EQ(0, ended_);
 }
 
+TEST_F(EveryIdentityCall, OfCountingAUse) {
+  const std::string hash = MakeLink();
+  SweepIdentity(Visit(), [&] { return TUVO::TuvoSharingIncreaseUseCount(hash) ? 1 : 0; }, {0, 1});
+  EXPECT_EQ(0, ended_);
+}
+
+// There is nothing to commit; what gives the file back may fail as well, once: the test's own too.
+TEST_F(EveryIdentityCall, OfCountingAUseOfALinkThatIsNotThere) {
+  const std::string hash = MakeLink();
+  SweepIdentity(Visit(),
+                [&] {
+                  const bool counted = TUVO::TuvoSharingIncreaseUseCount("nobodys");
+                  SharingDB& db = SharingDB::Instance();
+                  if (!db.Begin()) {
+                    // Refused by a fault, which is fair, or because one is open still.
+                    return db.GetLastError().find("within") == std::string::npos ? 1 : 2;
+                  }
+                  const bool ended = db.Execute("ROLLBACK") || db.Execute("ROLLBACK");
+                  return !counted && ended ? 1 : 0;
+                },
+                {0, 1});
+  EXPECT_EQ(0, ended_);
+}
+
+// What the connection said about a transaction that is over must not pass for what it says now.
+TEST_F(EveryIdentityCall, OfCountingAfterATransactionOfTheCallers) {
+  const std::string hash = MakeLink();
+  InChild([&] {
+    SharingDB& db = SharingDB::Instance();
+    ASSERT_TRUE(db.Begin());
+    ASSERT_TRUE(TUVO::TuvoSharingIncreaseUseCount(hash));
+    ASSERT_FALSE(db.Begin());  // tells so, and nothing that succeeds takes that back
+    ASSERT_TRUE(db.Commit());
+    FailAt(kIdentity, 1);
+    const bool counted = TUVO::TuvoSharingIncreaseUseCount(hash);
+    EXPECT_NE(kNoFault, StopFailing());
+    EXPECT_NE("cannot start a transaction within a transaction", db.GetLastError());
+    EXPECT_FALSE(counted);
+  });
+  EXPECT_EQ("1", Value("SELECT use_count FROM entry"));
+}
+
 TEST_F(EveryIdentityCall, OfCreatingALink) {
   SweepIdentity(Visit(),
                 [&] {
