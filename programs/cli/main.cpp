@@ -9,8 +9,8 @@
 #include "cli/failure.h"
 #include "cli/interrupt.h"
 #include "cli/output.h"
-#include "cli/secrecy.h"
 #include "cli/standard_output.h"
+#include "common/arguments.h"
 #include "common/core_dump.h"
 #include "common/privileges.h"
 #include "common/process_start.h"
@@ -50,7 +50,7 @@ cli::ExitStatus AfterOutput(cli::ExitStatus status) {
 
 cli::ExitStatus Run(int argc, char** argv) {
   const std::function<cli::ExitStatus()> command = cli::ReadCommandLine(argc, argv);
-  cli::WipeArguments(argc, argv);
+  common::WipeArguments(argc, argv);
   if (!command) {
     return AfterOutput(cli::ExitStatus::kDone);
   }

@@ -50,7 +50,11 @@ MaybeProblem Find(BaseDB& db, const LinkName& name, Scope scope, Entry* link) {
   if (MaybeProblem problem = Load(db, clause, link)) {
     return problem;
   }
-  return scope && link->get_owner_uid() != *scope ? NoSuchLink() : std::nullopt;
+  if (scope && link->get_owner_uid() != *scope) {
+    *link = Entry();
+    return NoSuchLink();
+  }
+  return std::nullopt;
 }
 
 // Whether another link than `id` has the hash; rows that do not load as a link count.

@@ -26,7 +26,8 @@ using Scope = std::optional<unsigned int>;
 // Error::kHashTaken returned when another link has it. On success `link` has its id and hash.
 MaybeProblem CreateLink(TUVO::sharing::db::BaseDB& db, TUVO::sharing::record::Entry* link);
 
-// Error::kNoSuchLink, also for links outside of the scope and rows that do not load as a link.
+// Error::kNoSuchLink, also for links outside of the scope and rows that do not load as a link;
+// `link` is then an empty one, here and in what follows.
 MaybeProblem FindLink(TUVO::sharing::db::BaseDB& db, const LinkName& name, Scope scope,
                       TUVO::sharing::record::Entry* link);
 
@@ -38,7 +39,8 @@ MaybeProblem ChangeLink(TUVO::sharing::db::BaseDB& db, const LinkName& name, Sco
                         const std::function<MaybeProblem(TUVO::sharing::record::Entry*)>& change,
                         TUVO::sharing::record::Entry* link);
 
-// Deletes the link, and with it, through the schema, its visitors' tokens. `link` is what it was.
+// Deletes the link, and with it, through the schema, its visitors' tokens. `link` is what it was,
+// also when it was found and could not be deleted.
 MaybeProblem DeleteLink(TUVO::sharing::db::BaseDB& db, const LinkName& name, Scope scope,
                         TUVO::sharing::record::Entry* link);
 

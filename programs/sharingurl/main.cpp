@@ -12,6 +12,7 @@
 #include <variant>
 #include <vector>
 
+#include "common/arguments.h"
 #include "common/config.h"
 #include "common/process_start.h"
 #include "sharingurl/address.h"
@@ -97,9 +98,7 @@ int Answer(const Request& request) {
 // machine can read that in /proc, and the hash is all that a stranger needs to open the link.
 std::vector<std::string> TakeArguments(int count, char** arguments) {
   std::vector<std::string> taken(arguments + (count > 0 ? 1 : 0), arguments + count);
-  for (int i = 1; i < count; ++i) {
-    explicit_bzero(arguments[i], std::strlen(arguments[i]));
-  }
+  common::WipeArguments(count, arguments);
   return taken;
 }
 

@@ -16,10 +16,11 @@ owner::MaybeProblem DeleteMethod(Turn* turn) {
     return problem;
   }
   TUVO::sharing::record::Entry link;
-  if (owner::MaybeProblem problem = owner::DeleteLink(*db, name, ScopeOf(turn->account), &link)) {
+  owner::MaybeProblem problem = owner::DeleteLink(*db, name, ScopeOf(turn->account), &link);
+  turn->link = link.get_id();
+  if (problem) {
     return problem;
   }
-  turn->link = link.get_id();
   turn->data["deleted"] = 1;
   return std::nullopt;
 }

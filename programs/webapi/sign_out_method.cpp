@@ -17,11 +17,12 @@ owner::MaybeProblem SignOutMethod(Turn* turn) {
   }
   TUVO::sharing::record::Entry link;
   int count = 0;
-  if (owner::MaybeProblem problem =
-          owner::SignOutVisitors(*db, name, ScopeOf(turn->account), turn->now, &link, &count)) {
+  owner::MaybeProblem problem =
+      owner::SignOutVisitors(*db, name, ScopeOf(turn->account), turn->now, &link, &count);
+  turn->link = link.get_id();
+  if (problem) {
     return problem;
   }
-  turn->link = link.get_id();
   turn->data["signed_out"] = count;
   return std::nullopt;
 }

@@ -10,6 +10,7 @@
 #include <string>
 #include <vector>
 
+#include "common/arguments.h"
 #include "common/core_dump.h"
 #include "common/environment.h"
 #include "common/privileges.h"
@@ -106,6 +107,7 @@ int main(int argc, char* argv[]) {
   const bool prepared = Prepare();
   try {
     const std::vector<std::string> arguments(argv + (argc > 0 ? 1 : 0), argv + argc);
+    common::WipeArguments(argc, argv);
     if (arguments.size() == 1 && arguments.front() == kHelp) {
       return Print(kUsage) ? EXIT_SUCCESS : EXIT_FAILURE;
     }

@@ -104,6 +104,21 @@ class Changes(ChangesTest):
         self.assertEqual(Visitor(SERVER).post(self.path).status, 410)
         self.assert_visit(200)
 
+    def test_limit_below_the_uses_puts_everybody_out(self):
+        self.change(expire_times=5, use_count=3)
+        self.assert_visit(200)
+        self.change(expire_times=2)
+        self.assert_visit(404)
+        self.assertNotEqual(Visitor(SERVER).post(self.path).status, 303)
+        self.change(expire_times=3)
+        self.assert_visit(200)
+
+    def test_end_in_the_past_puts_everybody_out(self):
+        self.change(expire_at="2020-01-01")
+        self.assert_visit(404)
+        self.change(expire_at="+1h")
+        self.assert_visit(200)
+
     def test_link_that_is_deleted_and_made_again(self):
         self.assertTrue(OWNER.call("alice", "delete", hash=self.link).ok)
         self.assert_visit(404)
@@ -176,8 +191,8 @@ class SigningOut(ChangesTest):
 
         def log_in():
             while not over.is_set():
-                Visitor(SERVER).post(self.path, {"password": "first"})
-        # Not so often that the address is locked out by what the change makes wrong.
+                Visitor(SERVER, "127.0.6.1").post(self.path, {"password": "first"})
+        # From an address of its own: what the change makes wrong may lock it out.
         thread = threading.Thread(target=log_in)
         thread.start()
         time.sleep(0.2)

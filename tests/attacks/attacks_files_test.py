@@ -96,7 +96,7 @@ class Sharing(unittest.TestCase):
 
     def hammer(self, name, target):
         front = ws.ToolFront()
-        stored = set()
+        stored, refused = set(), 0
         with Swapping(name, target):
             for _ in range(CREATIONS):
                 answer = front.call("alice", "create", project_name="file", app={"path": FILE})
@@ -104,6 +104,10 @@ class Sharing(unittest.TestCase):
                     stored.add(answer.data["link"]["app"]["path"])
                 else:
                     self.assertEqual(answer.code, 206)
+                    refused += 1
+        # Both came: the moment was hit.
+        self.assertGreater(len(stored), 0)
+        self.assertGreater(refused, 0)
         for path in stored:  # "folder.other" is what the folder is called every other moment
             self.assertTrue(path.startswith(SHARED + "/"), path)
         vs.sql("DELETE FROM entry")

@@ -68,7 +68,7 @@ class Processes(unittest.TestCase):
     def test_have_no_limit_that_a_core_fits_into(self):
         for spawned, _ in self.each():
             with open(f"/proc/{spawned.pid}/limits") as file:
-                self.assertRegex(file.read(), r"Max core file size +0 +0 ")
+                self.assertRegex(file.read(), r"Max core file size +1 +1 ")
 
     def test_cannot_be_looked_into_by_their_own_account(self):
         """What belongs to root in /proc may not be traced, nor its memory read, by others."""
@@ -142,7 +142,9 @@ class Times(unittest.TestCase):
         return {name: min(values) for name, values in times.items()}
 
     def assert_alike(self, found):
-        self.assertLess(max(found.values()), 2 * min(found.values()) + 1)
+        """None takes more than twice as long as another. This finds what does some more work for
+        one of them, and not a comparison that ends early, which is some nanoseconds."""
+        self.assertLess(max(found.values()), 2 * min(found.values()))
 
     def test_links_that_do_not_open_take_as_long_as_each_other(self):
         off = make_file_link(FILE, enabled=False)

@@ -2,6 +2,7 @@
 Arguments: the build folder, the project's folder."""
 
 import os
+import re
 import socket
 import subprocess
 import sys
@@ -67,7 +68,6 @@ class ByFastCgi(SizesTest):
             ({**plain, "HTTP_COOKIE": "a=" + "b; c=" * (HUGE // 5)}, b"", (400,)),
             ({**plain, "REMOTE_ADDR": text}, b"", (500,)),
             ({**plain, "REQUEST_METHOD": "GET", "QUERY_STRING": "redirect=" + text}, b"", (400,)),
-            ({**plain, "REQUEST_METHOD": "GET", "HTTP_RANGE": "bytes=" + text}, b"", (200,)),
             ({**plain, "REQUEST_METHOD": text}, b"", (405,)),
             ({**plain, "CONTENT_TYPE": "multipart/form-data; boundary=" + text}, b"", (400,)),
             ({**plain, "HTTP_X_TUVO_SHARING": text}, b"", (403,)),
@@ -75,6 +75,30 @@ class ByFastCgi(SizesTest):
             ({**plain, "CONTENT_LENGTH": "9" * HUGE}, b"", (400,)),
             ({**plain, "CONTENT_TYPE": "multipart/form-data; boundary=b",
               "CONTENT_LENGTH": str(len(multipart))}, multipart, (400,)),
+        ])
+
+    def test_visitor_who_is_in(self):
+        """These texts are looked at for him alone, before the file is sent."""
+        link = make_file_link(FILE)
+        given = {"PATH_INFO": "/" + link, "REMOTE_ADDR": "192.0.2.7", "QUERY_STRING": ""}
+        with fastcgi.Spawned(vs.PROGRAM, vs.WWW_DATA) as spawned:
+            answer, _ = spawned.request({**given, "REQUEST_METHOD": "POST", "CONTENT_LENGTH": "0"})
+        cookie = re.search(rb"sharing_sid=\S{32}", answer).group().decode()
+        admitted = {**given, "REQUEST_METHOD": "GET", "HTTP_COOKIE": cookie}
+        part = {**admitted, "HTTP_RANGE": "bytes=1-2"}
+        with fastcgi.Spawned(vs.PROGRAM, vs.WWW_DATA) as spawned:  # he is in
+            answer, _ = spawned.request(part)
+        self.assertTrue(answer.startswith(b"Status: 206"), answer[:100])
+        text = "x" * HUGE
+        # A range that is none is passed over, as is one for another version of the file; a list of
+        # tags has none of the file's.
+        self.answers(vs.PROGRAM, vs.WWW_DATA, [
+            ({**admitted, "HTTP_RANGE": "bytes=" + text}, b"", (200,)),
+            ({**admitted, "HTTP_RANGE": "bytes=" + "0-1," * (HUGE // 4) + "0-1"}, b"", (200,)),
+            ({**admitted, "HTTP_RANGE": "bytes=" + "9" * HUGE + "-"}, b"", (416,)),
+            ({**part, "HTTP_IF_RANGE": '"' + text + '"'}, b"", (200,)),
+            ({**admitted, "HTTP_IF_NONE_MATCH": '"x", ' * (HUGE // 5) + '"x"'}, b"", (200,)),
+            ({**admitted, "HTTP_IF_NONE_MATCH": text}, b"", (200,)),
         ])
 
     def test_owners(self):

@@ -7,7 +7,8 @@ namespace tuvo_test {
 
 Measure::~Measure() {
   const auto taken = std::chrono::steady_clock::now() - begin_;
-  const long time = std::chrono::duration_cast<std::chrono::microseconds>(taken).count();
+  const auto time =
+      static_cast<long>(std::chrono::duration_cast<std::chrono::microseconds>(taken).count());
   ++figure_.calls;
   figure_.all += time;
   long longest = figure_.longest;

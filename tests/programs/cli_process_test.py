@@ -49,7 +49,7 @@ class Secrets(CliTest):
             terminal.expect(b"again: ")
             with open(f"/proc/{terminal.pid}/limits") as file:
                 limits = [line.split()[4:6] for line in file if line.startswith("Max core file")]
-            self.assertEqual(limits, [["0", "0"]])
+            self.assertEqual(limits, [["1", "1"]])
             # A process that is not to be dumped belongs to root here.
             self.assertEqual(os.stat(f"/proc/{terminal.pid}/mem").st_uid, 0)
             terminal.type(b"\x1c")

@@ -9,14 +9,14 @@
 namespace common {
 namespace {
 
-// 0: neither by limit nor by program. A build with the address sanitizer stays open to its leak
-// check.
+// 0: neither a file, which the limit is too small for, nor by a program, which a limit of 0 would
+// not keep from it. A build with the address sanitizer stays open to its leak check.
 int CoresAfterForbidding() {
   const rlimit much{RLIM_INFINITY, RLIM_INFINITY};
   (void)setrlimit(RLIMIT_CORE, &much);
   ForbidCore();
-  rlimit now{1, 1};
-  if (getrlimit(RLIMIT_CORE, &now) != 0 || now.rlim_cur != 0 || now.rlim_max != 0) {
+  rlimit now{};
+  if (getrlimit(RLIMIT_CORE, &now) != 0 || now.rlim_cur != 1 || now.rlim_max != 1) {
     return 1;
   }
 #ifndef __SANITIZE_ADDRESS__

@@ -32,7 +32,7 @@ daemon off;
 worker_processes 1;
 events {}
 http {
-  access_log off;
+  access_log /tmp/nginx/access.log;
   server_tokens off;
   client_body_temp_path /tmp/nginx/body;
   fastcgi_temp_path /tmp/nginx/fastcgi;
@@ -170,6 +170,26 @@ class Visitors(unittest.TestCase):
     def test_other_paths(self):
         for path in "/sharing/", "/sharing/ab", "/sharing/abc/def", "/sharing/%2e%2e", "/other":
             self.assertEqual(Visitor(SERVER).get(path).status, 404, path)
+
+    def test_hashes_are_not_in_the_access_log(self):
+        link = make_file_link(FILE)
+        visitor = Visitor(SERVER)
+        visitor.get(path_of(link))
+        visitor.post(path_of(link))
+        visitor.get(path_of(link) + "?redirect=1")
+        query = "/webapi/entry.cgi?api=TUVO.Sharing.Link&version=1&method=get&hash=" + link
+        for headers in {}, login("alice", "alice-secret"):
+            visitor.request("GET", query, None, headers)
+        visitor.get("/logged")  # the witness: behind them, and there
+        text = ""
+        for _ in range(200):
+            with open("/tmp/nginx/access.log") as file:
+                text = file.read()
+            if "/logged" in text:
+                break
+            time.sleep(0.05)
+        self.assertIn("/logged", text)
+        self.assertNotIn(link, text)
 
     def test_large_request_stays_outside(self):
         reply = Visitor(SERVER).request("POST", "/sharing/abcdef", "x" * 1200 * 1024, {

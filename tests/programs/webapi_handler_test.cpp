@@ -17,6 +17,7 @@ namespace {
 using TUVO::sharing::db::SharingDB;
 using tuvo_test::allocations_left;
 
+constexpr const char* kDatabase = "/usr/tuvo/etc/private/session/sharing.db";
 const owner::Account kAlice{2001, "alice", false};
 
 Call CallOf(const std::string& method) {
@@ -165,6 +166,51 @@ TEST_F(WebapiHandler, LackOfMemoryIsAFailureOrThrownOn) {
       return call;
     });
   }
+}
+
+int CreatedLink() {
+  Call call = CallOf("create");
+  call.arguments["project_name"] = "x";
+  return Handle(call).document["data"]["link"]["id"].asInt();
+}
+
+Call CallOfLink(const std::string& method, int id) {
+  Call call = CallOf(method);
+  call.arguments["id"] = id;
+  return call;
+}
+
+std::string FailedEvent(const std::string& method, int link, int result, int by) {
+  return "sharing event=" + method + " link=" + std::to_string(link) +
+         " address=192.0.2.7 result=" + std::to_string(result) + " by=" + std::to_string(by);
+}
+
+TEST_F(WebapiHandler, FailureNamesTheLinkThatWasFound) {
+  SharingDB& db = SharingDB::Instance();
+  const int id = CreatedLink();
+  ASSERT_TRUE(db.Execute("INSERT INTO session (session_id) VALUES ('s')"));
+  ASSERT_TRUE(db.Execute(
+      "CREATE TEMP TRIGGER t BEFORE DELETE ON entry BEGIN SELECT RAISE(ABORT, 'x'); END"));
+  ASSERT_TRUE(db.Execute(
+      "CREATE TEMP TRIGGER u BEFORE DELETE ON token BEGIN SELECT RAISE(ABORT, 'x'); END"));
+  ASSERT_TRUE(db.Execute("INSERT INTO token (entry_id, session_id, timeout) SELECT " +
+                         std::to_string(id) + ", id, 9999999999 FROM session"));
+  for (const char* method : {"delete", "sign_out"}) {
+    Call call = CallOfLink(method, id);
+    EXPECT_EQ(EventOf(call), FailedEvent(method, id, 100, 2001));
+    call.account = owner::Account{2002, "bob", false};  // whose it is not
+    EXPECT_EQ(EventOf(call), FailedEvent(method, 0, 205, 2002));
+  }
+  EXPECT_TRUE(db.Execute("DROP TRIGGER t") && db.Execute("DROP TRIGGER u"));
+  EXPECT_TRUE(db.Execute("DELETE FROM session"));
+}
+
+TEST_F(WebapiHandler, LockedFileNamesTheLinkThatWasFound) {
+  const int id = CreatedLink();
+  SharingDB other(kDatabase);
+  ASSERT_TRUE(other.Execute("BEGIN IMMEDIATE"));
+  EXPECT_EQ(EventOf(CallOfLink("delete", id)), FailedEvent("delete", id, 207, 2001));
+  EXPECT_TRUE(other.Execute("ROLLBACK"));
 }
 
 TEST_F(WebapiHandler, DatabaseThatCannotBeUsedIsAFailure) {

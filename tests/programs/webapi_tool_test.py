@@ -8,6 +8,7 @@ import resource
 import select
 import shutil
 import signal
+import sqlite3
 import stat
 import subprocess
 import sys
@@ -156,6 +157,27 @@ class Accounts(unittest.TestCase):
 
 class Surroundings(unittest.TestCase):
     """What a local user can do to a program that is installed set-user-id root."""
+
+    def test_arguments_are_not_for_everybody(self):
+        lock = sqlite3.connect(vs.DATABASE, isolation_level=None)
+        lock.execute("BEGIN IMMEDIATE")  # it waits for that, its arguments read
+        process = subprocess.Popen([ws.TOOL, *START, "method=create", "project_name=x",
+                                    "hash=visible", "protect_password=visible"], user=2001,
+                                   group=2001, extra_groups=[], stdout=subprocess.PIPE, env=NOTHING)
+        try:
+            end = time.monotonic() + 8
+            words = b"visible"
+            while b"visible" in words and time.monotonic() < end:
+                time.sleep(0.01)
+                with open(f"/proc/{process.pid}/cmdline", "rb") as file:
+                    words = file.read()
+            self.assertIsNone(process.poll())
+        finally:
+            lock.execute("ROLLBACK")
+            lock.close()
+            answer = json.loads(process.communicate()[0])
+        self.assertEqual(words.rstrip(b"\0"), ws.TOOL.encode())
+        self.assertEqual(answer["data"]["link"]["hash"], "visible")
 
     def test_name_that_it_is_called_by_is_not_logged(self):
         with vs.SystemLog() as log:

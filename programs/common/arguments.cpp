@@ -1,8 +1,8 @@
-#include "cli/secrecy.h"
+#include "common/arguments.h"
 
 #include <cstring>
 
-namespace cli {
+namespace common {
 
 void WipeArguments(int argc, char** argv) {
   for (int i = 1; i < argc; ++i) {
@@ -10,4 +10,4 @@ void WipeArguments(int argc, char** argv) {
   }
 }
 
-}  // namespace cli
+}  // namespace common

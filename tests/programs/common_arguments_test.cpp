@@ -1,14 +1,14 @@
-#include "cli/secrecy.h"
+#include "common/arguments.h"
 
 #include <gtest/gtest.h>
 
 #include <array>
 #include <string>
 
-namespace cli {
+namespace common {
 namespace {
 
-TEST(CliSecrecy, WordsBehindTheProgramsNameAreWiped) {
+TEST(Arguments, WordsBehindTheProgramsNameAreWiped) {
   std::string name = "tuvosharing";
   std::string command = "show";
   std::string hash = "abcDEF123";
@@ -19,10 +19,10 @@ TEST(CliSecrecy, WordsBehindTheProgramsNameAreWiped) {
   EXPECT_EQ(hash, std::string(9, '\0'));
 }
 
-TEST(CliSecrecy, NoWordsAreNothingToWipe) {
+TEST(Arguments, NoWordsAreNothingToWipe) {
   char* argv = nullptr;
   WipeArguments(0, &argv);
 }
 
 }  // namespace
-}  // namespace cli
+}  // namespace common
