@@ -1,5 +1,8 @@
 // Meets every file of the given folders with the target function, without libFuzzer: so that the
 // kept inputs and the targets go on fitting the code between two rounds of fuzzing.
+#include <grp.h>
+#include <unistd.h>
+
 #include <algorithm>
 #include <cstdio>
 #include <cstdlib>
@@ -7,6 +10,7 @@
 #include <filesystem>
 #include <fstream>
 #include <iterator>
+#include <stdexcept>
 #include <string>
 #include <vector>
 
@@ -23,29 +27,45 @@ std::vector<std::filesystem::path> FilesIn(const std::filesystem::path& folder) 
   return files;
 }
 
-void Replay(const std::filesystem::path& path) {
+struct Input {
+  std::string name;
+  std::string bytes;
+};
+
+Input Read(const std::filesystem::path& path) {
   std::ifstream file(path, std::ios::binary);
-  const std::string input((std::istreambuf_iterator<char>(file)), std::istreambuf_iterator<char>());
+  Input input{path.filename(), {std::istreambuf_iterator<char>(file), {}}};
   if (!file.is_open() || file.bad()) {
-    std::fprintf(stderr, "cannot read %s\n", path.c_str());
-    std::exit(EXIT_FAILURE);
+    throw std::runtime_error("cannot read " + path.string());
   }
-  std::printf("%s\n", path.filename().c_str());  // the last one before an end without a word
-  std::fflush(stdout);
-  LLVMFuzzerTestOneInput(reinterpret_cast<const std::uint8_t*>(input.data()), input.size());
+  return input;
+}
+
+// The targets run as the system account, so that the library need not switch. The files are read
+// before: the project may lie below a folder that is root's alone.
+void BecomeSystem() {
+  if (setgroups(0, nullptr) != 0 || setresgid(1, 1, 1) != 0 || setresuid(1, 1, 1) != 0) {
+    throw std::runtime_error("cannot become the system account");
+  }
 }
 
 int Run(int argc, char* argv[]) {
-  std::size_t count = 0;
+  std::vector<Input> inputs;
   for (int i = 1; i < argc; ++i) {
-    for (const std::filesystem::path& file : FilesIn(argv[i])) {
-      Replay(file);
-      ++count;
+    for (const std::filesystem::path& path : FilesIn(argv[i])) {
+      inputs.push_back(Read(path));
     }
   }
+  BecomeSystem();
+  for (const Input& input : inputs) {
+    std::printf("%s\n", input.name.c_str());  // the last one before an end without a word
+    std::fflush(stdout);
+    LLVMFuzzerTestOneInput(reinterpret_cast<const std::uint8_t*>(input.bytes.data()),
+                           input.bytes.size());
+  }
   LLVMFuzzerTestOneInput(nullptr, 0);
-  std::printf("%zu inputs\n", count);
-  return count == 0 ? EXIT_FAILURE : EXIT_SUCCESS;
+  std::printf("%zu inputs\n", inputs.size());
+  return inputs.empty() ? EXIT_FAILURE : EXIT_SUCCESS;
 }
 
 }  // namespace
