@@ -66,13 +66,13 @@ void Print(const Entry& link, const CreateOptions& options, std::time_t now) {
   if (std::cout.flush()) {
     return;
   }
-  const Failure failure(ExitStatus::kFailed, "the link is made (#" + std::to_string(link.get_id()) +
-                                                 "); its hash cannot be written");
+  const std::string message =
+      "the link is made (#" + std::to_string(link.get_id()) + "); its hash cannot be written";
   if (NotedSignal() != 0) {
-    Complain(failure.what());
+    Complain(message);
     throw Interruption();
   }
-  throw failure;
+  throw Failure(ExitStatus::kFailed, message);
 }
 
 ExitStatus MakeAndPrint(const CreateOptions& options) {
