@@ -188,10 +188,12 @@ TEST_F(OwnerShareableFile, FileOfAnotherMountNamespaceMayNot) {
   ASSERT_TRUE(fs::exists(root + "/tmp/share/bobs/secret"));
   EXPECT_EQ(Check(root + "/tmp/share/bobs/secret"), FileAnswer::kNotReadable);
   EXPECT_EQ(resolved_, "");
-  // What is the same file there and here may be named so.
-  EXPECT_EQ(Check(root + "/tmp/share/alices"), FileAnswer::kMay);
-  EXPECT_EQ(resolved_, "/tmp/share/alices");
   End(sleeper);
+}
+
+TEST_F(OwnerShareableFile, FileNamedByWayOfProcIsResolved) {
+  EXPECT_EQ(Check("/proc/self/root/tmp/share/alices"), FileAnswer::kMay);
+  EXPECT_EQ(resolved_, "/tmp/share/alices");
 }
 
 // Its path is told with " (deleted)" behind it, and somebody else may have a file of that name.
