@@ -1,18 +1,14 @@
 #include "owner/visitors.h"
-#include "webapi/database.h"
 #include "webapi/link_api.h"
-#include "webapi/link_name.h"
+#include "webapi/named_link.h"
 #include "webapi/ownership.h"
 
 namespace webapi {
 
 owner::MaybeProblem SignOutMethod(Turn* turn) {
   owner::LinkName name;
-  if (owner::MaybeProblem problem = ReadLinkName(turn->arguments, &name)) {
-    return problem;
-  }
   TUVO::sharing::db::BaseDB* db = nullptr;
-  if (owner::MaybeProblem problem = OpenDatabase(&db)) {
+  if (owner::MaybeProblem problem = OpenForNamedLink(*turn, &db, &name)) {
     return problem;
   }
   TUVO::sharing::record::Entry link;

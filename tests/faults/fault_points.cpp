@@ -10,8 +10,9 @@
 #include <cstddef>
 #include <cstdio>
 #include <cstdlib>
-#include <new>
 #include <utility>
+
+#include "support/failing_new.h"
 
 namespace tuvo_test {
 namespace {
@@ -300,49 +301,10 @@ __attribute__((constructor)) void StandBeforeSqlitesMemory() {
   sqlite3_config(SQLITE_CONFIG_MALLOC, &methods);
 }
 
-void* New(std::size_t size) {
-  return tuvo_test::Fails(tuvo_test::kMemory) ? nullptr : std::malloc(size != 0 ? size : 1);
-}
-
-void* NewOrThrow(std::size_t size) {
-  void* memory = New(size);
-  if (memory == nullptr) {
-    throw std::bad_alloc();
-  }
-  return memory;
-}
-
 }  // namespace
 
-void* operator new(std::size_t size) {
-  return NewOrThrow(size);
-}
-void* operator new[](std::size_t size) {
-  return NewOrThrow(size);
-}
-void* operator new(std::size_t size, const std::nothrow_t& /*tag*/) noexcept {
-  return New(size);
-}
-void* operator new[](std::size_t size, const std::nothrow_t& /*tag*/) noexcept {
-  return New(size);
-}
-void operator delete(void* memory) noexcept {
-  std::free(memory);
-}
-void operator delete[](void* memory) noexcept {
-  std::free(memory);
-}
-void operator delete(void* memory, std::size_t /*size*/) noexcept {
-  std::free(memory);
-}
-void operator delete[](void* memory, std::size_t /*size*/) noexcept {
-  std::free(memory);
-}
-void operator delete(void* memory, const std::nothrow_t& /*tag*/) noexcept {
-  std::free(memory);
-}
-void operator delete[](void* memory, const std::nothrow_t& /*tag*/) noexcept {
-  std::free(memory);
+bool tuvo_test::MayAllocate() noexcept {
+  return !Fails(kMemory);
 }
 
 #endif

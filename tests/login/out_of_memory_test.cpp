@@ -1,9 +1,7 @@
 // The login API when memory runs out: at every single allocation of C++ that an operation makes.
 // A program in C could not catch what would then be thrown, so every operation has to come back.
-#include <cstdlib>
-#include <new>
-
 #include "login/visit.h"
+#include "support/failing_new.h"
 
 namespace {
 
@@ -11,7 +9,11 @@ constexpr long kUnlimited = -1;
 long allocations_left = kUnlimited;
 bool later_ones_succeed = false;
 
-bool MayAllocate() {
+}  // namespace
+
+namespace tuvo_test {
+
+bool MayAllocate() noexcept {
   if (allocations_left > 0) {
     --allocations_left;
     return true;
@@ -23,53 +25,6 @@ bool MayAllocate() {
   return allocations_left == kUnlimited;
 }
 
-void* Allocate(std::size_t size) noexcept {
-  return MayAllocate() ? std::malloc(size != 0 ? size : 1) : nullptr;
-}
-
-void* AllocateOrThrow(std::size_t size) {
-  void* memory = Allocate(size);
-  if (memory == nullptr) {
-    throw std::bad_alloc();
-  }
-  return memory;
-}
-
-}  // namespace
-
-// All forms, since a sanitizer brings all of them and wants each freed by its own counterpart.
-void* operator new(std::size_t size) {
-  return AllocateOrThrow(size);
-}
-void* operator new[](std::size_t size) {
-  return AllocateOrThrow(size);
-}
-void* operator new(std::size_t size, const std::nothrow_t& /*tag*/) noexcept {
-  return Allocate(size);
-}
-void* operator new[](std::size_t size, const std::nothrow_t& /*tag*/) noexcept {
-  return Allocate(size);
-}
-void operator delete(void* memory) noexcept {
-  std::free(memory);
-}
-void operator delete[](void* memory) noexcept {
-  std::free(memory);
-}
-void operator delete(void* memory, std::size_t /*size*/) noexcept {
-  std::free(memory);
-}
-void operator delete[](void* memory, std::size_t /*size*/) noexcept {
-  std::free(memory);
-}
-void operator delete(void* memory, const std::nothrow_t& /*tag*/) noexcept {
-  std::free(memory);
-}
-void operator delete[](void* memory, const std::nothrow_t& /*tag*/) noexcept {
-  std::free(memory);
-}
-
-namespace tuvo_test {
 namespace {
 
 // What a process of the sweep below found out.
