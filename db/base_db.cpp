@@ -251,6 +251,10 @@ bool BaseDBPrivate::GetLastInsertId(int& id) const {
   return true;
 }
 
+bool BaseDBPrivate::IsInTransaction() const {
+  return handle_ != nullptr && sqlite3_get_autocommit(handle_->sqlite) == 0;
+}
+
 std::string BaseDBPrivate::GetLastError() const {
   return last_error_;
 }

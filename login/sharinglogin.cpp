@@ -2,6 +2,7 @@
 #include <internal/contained.h>
 #include <internal/log.h>
 #include <internal/user_access.h>
+#include <internal/write_transaction.h>
 #include <tuvoplatform/auto_block.h>
 #include <tuvosharing/entry_db.h>
 #include <tuvosharing/login.h>
@@ -11,6 +12,8 @@
 
 #include <ctime>
 #include <limits>
+#include <optional>
+#include <string>
 #include <utility>
 
 namespace TUVO {
@@ -24,6 +27,7 @@ using sharing::db::EntryDB;
 using sharing::db::SessionDB;
 using sharing::db::SharingDB;
 using sharing::db::TokenDB;
+using sharing::db::WriteTransaction;
 using sharing::record::Entry;
 using sharing::record::Session;
 using sharing::record::Token;
@@ -41,6 +45,7 @@ enum ResultCode {
   kWrongPassword = -9,
   kAccountNotListed = -10,
   kUsedUp = -11,
+  kLinkChanged = 0,  // never leaves a login
 };
 
 // How long session and token last after a login and after every authorised request.
@@ -105,11 +110,26 @@ bool TakeSession(SessionDB& sessions, const char* sharing_sid, const std::string
   return sessions.CreateWithSessionId(session);
 }
 
+// Whether there is certainly no row of the condition: a look-up that fails finds none, too.
+template <typename Store>
+bool HasNone(const Store& store) {
+  int count = 0;
+  return store.Count(count) && count == 0;
+}
+
 // Renews the token of session and link, expired or not, or creates one.
-bool TakeToken(TokenDB& tokens, const Session& session, const Entry& entry, Token& token) {
+bool TakeToken(const WriteTransaction& transaction, TokenDB& tokens, const Session& session,
+               const Entry& entry, Token& token) {
   if (WasFound(tokens.GetBySessionEntry(session, entry, token), token)) {
     token.set_timeout(EndOfLifetime());
     return tokens.Update(token);
+  }
+  // Of two tokens for the pair a logout would remove one. And a token that is no part of the
+  // transaction would stay when that fails.
+  tokens.GetCondition().Where("session_id", std::to_string(session.get_id()));
+  tokens.GetCondition().Where("entry_id", std::to_string(entry.get_id()));
+  if (!HasNone(tokens) || !transaction.IsOpen()) {
+    return false;
   }
   token.set_session_id(session.get_id());
   token.set_entry_id(entry.get_id());
@@ -117,120 +137,133 @@ bool TakeToken(TokenDB& tokens, const Session& session, const Entry& entry, Toke
   return tokens.Create(token);
 }
 
-// What remains once the visitor is admitted and the use counted: session and token. On failure the
-// token is taken back.
-bool Admit(SharingDB& db, const Entry& entry, const char* sharing_sid, unsigned int uid,
-           std::string& session_id) {
-  SessionDB sessions(db);
-  TokenDB tokens(db);
-  Session session;
-  Token token;
-  std::string ip;
-  if (db.IsGood() && GetRemoteIP(ip) && TakeSession(sessions, sharing_sid, ip, session)) {
-    // Copied before there is a token: without memory for it later, one would stay behind.
-    std::string text = session.get_session_id();
-    if (entry.get_protect_type() == Entry::PROTECT_USER) {
-      session.set_uid(uid);
-    }
-    if (TakeToken(tokens, session, entry, token) && sessions.Update(session)) {
-      session_id = std::move(text);
-      return true;
-    }
-  }
-  tokens.Delete(token);
-  return false;
-}
-
 // One use stricter than the link's own validity, so that a limit of N admits exactly N logins.
 bool IsUsedUp(const Entry& entry) {
   return entry.get_expire_times() > 0 && entry.get_use_count() >= entry.get_expire_times();
 }
 
-// Holds the file for writing until it is committed or taken back. Within a transaction of the
-// caller's own this is none, and that one decides.
-class WriteTransaction {
- public:
-  explicit WriteTransaction(SharingDB& db)
-      : db_(db), open_(Begin()), begun_(open_ || IsWithinAnother()) {}
-  ~WriteTransaction() {
-    // Once more: a transaction that a passing fault leaves open would lock everybody out, and take
-    // in all that this process writes from now on.
-    if (open_ && !db_.Execute("ROLLBACK")) {
-      db_.Execute("ROLLBACK");
-    }
-  }
-  WriteTransaction(const WriteTransaction&) = delete;
-  WriteTransaction& operator=(const WriteTransaction&) = delete;
-
-  // False when the file could not be had, being locked by somebody else for one.
-  bool HasBegun() const { return begun_; }
-  bool Commit() { return !std::exchange(open_, false) || db_.Commit(); }
-
- private:
-  bool Begin() {
-    // The last error may be an earlier statement's, and a switch of identity that fails leaves it.
-    // A statement that the connection itself refuses puts another in its place.
-    if (IsWithinAnother()) {
-      db_.Execute(std::string(1, '\0'));
-    }
-    return db_.Execute("BEGIN IMMEDIATE");
-  }
-
-  // What SQLite says to a second BEGIN.
-  bool IsWithinAnother() const {
-    return db_.GetLastError().find("within a transaction") != std::string::npos;
-  }
-
-  SharingDB& db_;
-  bool open_;
-  bool begun_;
-};
+// Whether whoever is let in by one link is by the other: the same link, in force for the same time
+// and protected in the same way.
+bool AdmitAlike(const Entry& one, const Entry& other) {
+  return one.get_id() == other.get_id() && one.get_enabled() == other.get_enabled() &&
+         one.get_start_at() == other.get_start_at() &&
+         one.get_expire_at() == other.get_expire_at() &&
+         one.get_protect_type() == other.get_protect_type() &&
+         one.get_protect_password() == other.get_protect_password() &&
+         one.get_protect_uids() == other.get_protect_uids() &&
+         one.get_protect_gids() == other.get_protect_gids();
+}
 
 enum class Count {
   kDone,
   kFailed,
-  kUsedUp,  // nothing was written
+  kUsedUp,   // nothing was written
+  kChanged,  // nothing was written: the link that let the visitor in is not there any more
 };
 
-// Whom a use is counted for.
-enum class CountFor {
-  kCaller,  // who has decided already: whatever the limit says
-  kLogin,   // only as long as the limit is not reached
-};
-
-Count CountUse(EntryDB& entries, const std::string& hash, CountFor whom) {
+// `admitting` is the link as it let the visitor in; null for a caller who has decided already.
+Count CountUse(EntryDB& entries, const std::string& hash, const Entry* admitting) {
   Entry entry;
   if (!entries.GetByHash(hash, entry)) {
-    return Count::kFailed;
+    entries.GetCondition().Where("hash", hash);
+    return admitting != nullptr && HasNone(entries) ? Count::kChanged : Count::kFailed;
   }
-  if (whom == CountFor::kLogin && IsUsedUp(entry)) {
+  if (admitting != nullptr && !AdmitAlike(entry, *admitting)) {
+    return Count::kChanged;
+  }
+  if (admitting != nullptr && IsUsedUp(entry)) {
     return Count::kUsedUp;
   }
   entry.inc_use_count();
   return entries.Update(entry) ? Count::kDone : Count::kFailed;
 }
 
-Count IncreaseUseCount(const std::string& hash, CountFor whom) {
+bool IncreaseUseCount(const std::string& hash) {
   SharingDB& db = SharingDB::Instance();
   if (!db.IsGood()) {
-    return Count::kFailed;
+    return false;
   }
   EntryDB entries(db);  // checkpoints when the transaction is over
-  // The whole link is read and written back: what its owner, or another login, writes in between
-  // would be undone, a link that was just switched off would be on again.
+  // The whole link is read and written back: what its owner, or a login, writes in between would be
+  // undone, a link that was just switched off would be on again.
   WriteTransaction transaction(db);
-  if (!transaction.HasBegun()) {
-    return Count::kFailed;
+  return transaction.IsOpen() && CountUse(entries, hash, nullptr) == Count::kDone &&
+         transaction.Commit();
+}
+
+// Session and token of a visitor who is past the link's protection. On failure `token` is what
+// there is to take back.
+bool Admit(SharingDB& db, const WriteTransaction& transaction, SessionDB& sessions, TokenDB& tokens,
+           const Entry& entry, const char* sharing_sid, unsigned int uid, Token& token,
+           std::string& session_id) {
+  Session session;
+  std::string ip;
+  if (!db.IsGood() || !GetRemoteIP(ip) || !TakeSession(sessions, sharing_sid, ip, session) ||
+      !TakeToken(transaction, tokens, session, entry, token)) {
+    return false;
   }
-  const Count count = CountUse(entries, hash, whom);
-  return count == Count::kDone && !transaction.Commit() ? Count::kFailed : count;
+  if (entry.get_protect_type() == Entry::PROTECT_USER) {
+    session.set_uid(uid);
+  }
+  session_id = session.get_session_id();
+  return sessions.Update(session);
 }
 
-Count CountLogin(const std::string& hash) {
-  return Contained([&] { return IncreaseUseCount(hash, CountFor::kLogin); }, Count::kFailed);
+void LogUncounted() {
+  SHARING_LOG("update entry use count fail");
 }
 
-int Login(std::string& session_id, const _tag_sharing_login_params* params, bool skip_autoblock) {
+// Counts the use and lets the visitor in. All of it holds the file, so that nothing comes in
+// between: other visitors may have taken the last uses since the link was read, and its owner may
+// have changed it and signed everybody out.
+int CountAndAdmit(SharingDB& db, const Entry& entry, const _tag_sharing_login_params* params,
+                  unsigned int uid, std::string& session_id) {
+  EntryDB entries(db);  // these checkpoint when the transaction is over
+  SessionDB sessions(db);
+  TokenDB tokens(db);
+  std::optional<WriteTransaction> transaction(std::in_place, db);
+  const auto count = [&] { return CountUse(entries, params->sharing_id, &entry); };
+  bool counted = false;
+  switch (transaction->IsOpen() ? Contained(count, Count::kFailed) : Count::kFailed) {
+    case Count::kDone:
+      counted = true;
+      break;
+    case Count::kUsedUp:
+      return kUsedUp;
+    case Count::kChanged:
+      return kLinkChanged;
+    case Count::kFailed:
+      LogUncounted();
+      transaction.emplace(db);  // takes back what there is of the failed one
+  }
+  Token token;
+  std::string text;
+  const auto admit = [&] {
+    return transaction->IsOpen() &&
+           Admit(db, *transaction, sessions, tokens, entry, params->sharing_sid, uid, token, text);
+  };
+  const bool admitted = Contained(admit);
+  // Whoever is not admitted has used the link all the same. A token of a transaction that is gone
+  // is gone with it, and its number may be somebody else's by now.
+  if (!admitted && transaction->IsOpen()) {
+    tokens.Delete(token);
+  }
+  if (!transaction->Commit()) {
+    if (counted) {
+      LogUncounted();
+    }
+    return kFailed;
+  }
+  if (!admitted) {
+    return kFailed;
+  }
+  session_id = std::move(text);
+  return kSuccess;
+}
+
+// kLinkChanged when it has to be done again.
+int TryLogin(std::string& session_id, const _tag_sharing_login_params* params,
+             bool skip_autoblock) {
   SharingDB& db = SharingDB::Instance();
   if (params == nullptr || !db.IsGood() || params->sharing_id == nullptr) {
     return kFailed;
@@ -261,23 +294,20 @@ int Login(std::string& session_id, const _tag_sharing_login_params* params, bool
     }
     return protection;
   }
-  // The limit is decided again with the file held: other visitors may have taken the last uses
-  // since the link was read.
-  switch (CountLogin(params->sharing_id)) {
-    case Count::kDone:
-      break;
-    case Count::kUsedUp:
-      return kUsedUp;
-    case Count::kFailed:
-      SHARING_LOG("update entry use count fail");
-  }
-  if (!Admit(db, entry, params->sharing_sid, uid, session_id)) {
-    return kFailed;
-  }
-  if (!skip_autoblock) {
+  const int admission = CountAndAdmit(db, entry, params, uid, session_id);
+  if (admission == kSuccess && !skip_autoblock) {
     TUVOAutoBlockFailLoginReset(ip.c_str());
   }
-  return kSuccess;
+  return admission;
+}
+
+int Login(std::string& session_id, const _tag_sharing_login_params* params, bool skip_autoblock) {
+  for (;;) {
+    const int result = TryLogin(session_id, params, skip_autoblock);
+    if (result != kLinkChanged) {
+      return result;
+    }
+  }
 }
 
 int IsAuthorized(const _tag_sharing_login_params* params) {
@@ -398,8 +428,7 @@ bool TuvoSharingLogout(const std::string& hash, const std::string& session_id) {
 }
 
 bool TuvoSharingIncreaseUseCount(const std::string& hash) {
-  return Contained([&] { return IncreaseUseCount(hash, CountFor::kCaller) == Count::kDone; },
-                   false);
+  return Contained([&] { return IncreaseUseCount(hash); }, false);
 }
 
 }  // namespace TUVO

@@ -34,6 +34,9 @@ class BaseDBPrivate {
   bool IsRoot() const;
   bool MoveRootDB() const;
 
+  // Whether a transaction is open, whoever began it.
+  bool IsInTransaction() const;
+
   // What `operation` answers; false, with a reason in the last error, when it throws: the texts
   // that it makes did not fit, or one could not be escaped.
   template <typename Operation>

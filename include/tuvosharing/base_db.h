@@ -13,6 +13,7 @@ namespace TUVO::sharing::db {
 
 class BaseDBPrivate;
 class Result;
+class WriteTransaction;
 
 // Every statement runs with the effective ids of the system identity (uid 1, gid 1), which the
 // process must be or be able to take (root among its ids); they are put back before the call
@@ -86,6 +87,8 @@ class TUVOSHARING_API BaseDB {
   bool MoveRootDB() const;
 
  private:
+  friend class WriteTransaction;
+
   std::unique_ptr<BaseDBPrivate> p_;
 };
 

@@ -76,7 +76,7 @@ TUVODB* TUVODBConnect(const char* /*host*/, const char* /*user*/, const char* /*
   if (connection == nullptr || !Open(connection.get(), path)) {
     return nullptr;
   }
-  tuvo_platform::KeepLogShort(connection->sqlite);
+  tuvo_platform::WatchLog(connection.get());
   return connection.release();
 }
 
@@ -94,10 +94,12 @@ int TUVODBExecute(TUVODB* db, const char* sql, DBResult_tag** result) {
   }
   const bool callers_transaction = sqlite3_get_autocommit(db->sqlite) == 0;
   std::unique_ptr<DBResult_tag> rows;
-  if (!RunAll(connection, sql, &rows)) {
-    if (!callers_transaction) {
-      RollBackIfOpen(connection);
-    }
+  const bool done = RunAll(connection, sql, &rows);
+  if (!done && !callers_transaction) {
+    RollBackIfOpen(connection);
+  }
+  tuvo_platform::KeepLogShort(connection);
+  if (!done) {
     return -1;
   }
   if (result != nullptr) {

@@ -25,6 +25,8 @@ struct Connection : TUVODB_tag {
   // "ROLLBACK", made when the connection is: taking a transaction back must not fail for want of
   // memory, or the file would stay locked for as long as the process lives.
   sqlite3_stmt* rollback = nullptr;
+  // How long the last commit left the write-ahead log, until somebody has looked; in pages.
+  int log_pages = 0;
 };
 
 // Short enough to need no memory of its own in a std::string.

@@ -4,7 +4,9 @@
 
 #include <chrono>
 #include <thread>
+#include <utility>
 
+#include "database_connection.h"
 #include "database_wait.h"
 
 namespace tuvo_platform {
@@ -23,16 +25,16 @@ constexpr int kAttempts = 20;
 constexpr milliseconds kPause{5};
 constexpr milliseconds kNoWait{0};
 
-int FoldBack(sqlite3* sqlite, const char* database, int mode) {
-  return sqlite3_wal_checkpoint_v2(sqlite, database, mode, nullptr, nullptr);
+int FoldBack(sqlite3* sqlite, int mode) {
+  return sqlite3_wal_checkpoint_v2(sqlite, nullptr, mode, nullptr, nullptr);
 }
 
 // An ordinary checkpoint ends where the log ended when it began. Among many writers there is more
 // by then, and the log would never be begun anew. This one lets nobody write until it is through.
-void FoldBackAll(sqlite3* sqlite, const char* database) {
+void FoldBackAll(sqlite3* sqlite) {
   SetBusyWait(sqlite, &kNoWait);
   for (int attempt = 0; attempt < kAttempts; ++attempt) {
-    if (FoldBack(sqlite, database, SQLITE_CHECKPOINT_RESTART) != SQLITE_BUSY) {
+    if (FoldBack(sqlite, SQLITE_CHECKPOINT_RESTART) != SQLITE_BUSY) {
       break;
     }
     std::this_thread::sleep_for(kPause);
@@ -40,19 +42,24 @@ void FoldBackAll(sqlite3* sqlite, const char* database) {
   SetBusyWait(sqlite);
 }
 
-int AfterCommit(void* /*context*/, sqlite3* sqlite, const char* database, int pages) {
-  if (pages >= kVeryLong) {
-    FoldBackAll(sqlite, database);
-  } else if (pages >= kLong) {
-    FoldBack(sqlite, database, SQLITE_CHECKPOINT_PASSIVE);
-  }
+int AfterCommit(void* connection, sqlite3* /*sqlite*/, const char* /*database*/, int pages) {
+  static_cast<Connection*>(connection)->log_pages = pages;
   return SQLITE_OK;
 }
 
 }  // namespace
 
-void KeepLogShort(sqlite3* sqlite) {
-  sqlite3_wal_hook(sqlite, AfterCommit, nullptr);
+void WatchLog(Connection* connection) {
+  sqlite3_wal_hook(connection->sqlite, AfterCommit, connection);
+}
+
+void KeepLogShort(Connection* connection) {
+  const int pages = std::exchange(connection->log_pages, 0);
+  if (pages >= kVeryLong) {
+    FoldBackAll(connection->sqlite);
+  } else if (pages >= kLong) {
+    FoldBack(connection->sqlite, SQLITE_CHECKPOINT_PASSIVE);
+  }
 }
 
 }  // namespace tuvo_platform

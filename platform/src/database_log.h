@@ -2,14 +2,17 @@
 #ifndef PLATFORM_SRC_DATABASE_LOG_H_
 #define PLATFORM_SRC_DATABASE_LOG_H_
 
-struct sqlite3;
-
 namespace tuvo_platform {
 
-// From now on every commit of the connection that leaves a long log behind folds it back into the
-// file; a very long one by force, so that it begins anew however many others read and write. A
-// commit never fails for that.
-void KeepLogShort(sqlite3* sqlite);
+struct Connection;
+
+// From now on the connection knows how long its commits leave the log.
+void WatchLog(Connection* connection);
+
+// Folds a long log back into the file; a very long one by force, so that it begins anew however
+// many others read and write. For behind a statement: a commit that did this itself, as SQLite
+// would have it, would answer that it failed when this does.
+void KeepLogShort(Connection* connection);
 
 }  // namespace tuvo_platform
 

@@ -16,7 +16,7 @@ namespace tuvo_test {
 constexpr int kWorkers = 32;
 constexpr int kPublicLinks = 8;
 constexpr int kLimitedLink = kPublicLinks - 1;  // the one with a limit of uses
-constexpr int kLimit = 200;
+constexpr int kLimit = 20;
 constexpr int kMaxOwnLinks = 20000;
 constexpr int kMaxSessions = 100000;
 

@@ -225,7 +225,7 @@ class ManyProcesses : public testing::Test {
                "SELECT hash, json_extract(data, '$.protect_title'), use_count FROM entry "
                "WHERE auto_gc = 0");
     EXPECT_EQ("", Difference(wanted, found));
-    EXPECT_LE(board_->link[kLimitedLink].uses, kLimit);
+    EXPECT_EQ(kLimit, board_->link[kLimitedLink].uses) << "what comes behind the limit was not met";
   }
 
   static std::string Title(int title) { return title == 0 ? "" : std::to_string(title); }

@@ -11,6 +11,7 @@
 #include <iterator>
 #include <limits>
 #include <set>
+#include <vector>
 
 #include "login/other_writer.h"
 #include "login/platform_spy.h"
@@ -31,6 +32,13 @@ class LinkLogin : public VisitTest {
   std::string UseCount() { return Value("SELECT use_count FROM entry"); }
   std::string Sessions() { return Value("SELECT COUNT(*) FROM session"); }
   std::string Tokens() { return Value("SELECT COUNT(*) FROM token"); }
+
+  // Waits for a process that is to end well.
+  static void Join(pid_t process) {
+    int status = -1;
+    EXPECT_EQ(process, waitpid(process, &status, 0));
+    EXPECT_EQ(0, status);
+  }
 
   // Expects that the login was refused with `code` and left no trace in the database; how many
   // failed logins count afterwards is for each test to say.
@@ -90,14 +98,14 @@ TEST_F(LinkLogin, CountsTheUseOfTheLinkAsItIsThen) {
   const Visit visit = AliceAt(MakeAccountLink());
   Run(visit, [&](std::string& session_id) {
     Spy().at_login = [] {
-      SqliteFile(kDatabase).Execute("UPDATE entry SET use_count = 5, enabled = 0");
+      SqliteFile(kDatabase).Execute("UPDATE entry SET use_count = 5, expire_times = 9");
     };
     _tag_sharing_login_params params = visit.Params();
     EXPECT_EQ(1, TUVO::TuvoSharingLogin(session_id, &params, false));
     return 0;
   });
   EXPECT_EQ("6", UseCount());
-  EXPECT_EQ("0", Value("SELECT enabled FROM entry"));
+  EXPECT_EQ("9", Value("SELECT expire_times FROM entry"));
 }
 
 // What a request must bring.
@@ -328,9 +336,7 @@ TEST_F(LinkLogin, WhoLosesTheLastUseToAnotherIsToldAsIfHeCameAfterwards) {
   const std::string hash = MakeLimitedLink(3, 2);
   const pid_t other = StartWriter("UPDATE entry SET use_count = 3");
   const Reply reply = Login(Visit(hash));
-  int status = -1;
-  EXPECT_EQ(other, waitpid(other, &status, 0));
-  EXPECT_EQ(0, status);
+  Join(other);
   EXPECT_EQ(-11, reply.code);
   EXPECT_EQ(kUntouched, reply.session_id);
   EXPECT_EQ(Lines{}, reply.log);
@@ -342,12 +348,98 @@ TEST_F(LinkLogin, WhoLosesTheLastUseToAnotherIsToldAsIfHeCameAfterwards) {
 
 TEST_F(LinkLogin, TheLimitIsTheOneOfTheMomentOfCounting) {
   const std::string hash = MakeLimitedLink(3, 2);
-  const pid_t owner = StartWriter("UPDATE entry SET use_count = 3, expire_times = 4, enabled = 0");
+  const pid_t owner = StartWriter("UPDATE entry SET use_count = 3, expire_times = 4");
   EXPECT_EQ(1, Login(Visit(hash)).code);
-  int status = -1;
-  EXPECT_EQ(owner, waitpid(owner, &status, 0));
-  EXPECT_EQ((std::vector<TextRow>{{"4", "4", "0"}}),
-            Rows("SELECT use_count, expire_times, enabled FROM entry"));
+  Join(owner);
+  EXPECT_EQ((std::vector<TextRow>{{"4", "4"}}), Rows("SELECT use_count, expire_times FROM entry"));
+}
+
+// The owner's change is written while the login has the link's former protection behind it.
+TEST_F(LinkLogin, WhoIsLetInByALinkThatIsChangedMeanwhileIsJudgedByTheNewOne) {
+  const std::pair<const char*, int> changes[] = {
+      {"UPDATE entry SET enabled = 0", -3},
+      {"UPDATE entry SET start_at = 2147483647", -3},
+      {"UPDATE entry SET expire_at = 1", -3},
+      {"UPDATE entry SET data = replace(data, '\"protect_password\":\"', "
+       "'\"protect_password\":\"f')",
+       -9},
+      {"DELETE FROM entry", -3},
+      {"UPDATE entry SET id = id + 100", 1},
+      {"UPDATE entry SET auto_gc = 1, owner_uid = 2002", 1},
+  };
+  for (const auto& [change, code] : changes) {
+    const std::string hash = MakePasswordLink();
+    const pid_t owner = StartWriter(change);
+    const Reply reply = Login(Visit(hash).Password("sesame"), true);
+    Join(owner);
+    EXPECT_EQ(code, reply.code) << change;
+    EXPECT_EQ(std::to_string(code == 1 ? 1 : 0), Tokens()) << change;
+    Change("DELETE FROM token");
+    Change("DELETE FROM entry");
+  }
+}
+
+TEST_F(LinkLogin, WhoIsListedNoMoreWhenTheUseIsCountedIsRefused) {
+  for (const char* const list : {"uids", "gids"}) {
+    const Visit visit = AliceAt(MakeLink([list](Entry& entry) {
+      entry.set_protect_type(Entry::PROTECT_USER);
+      if (list == std::string("uids")) {
+        entry.set_protect_uids({kAlice, kBob});
+      } else {
+        entry.set_protect_gids({kFriends});
+      }
+    }));
+    Run(visit, [&](std::string& session_id) {
+      Spy().at_login = [list] {
+        SqliteFile(kDatabase).Execute("UPDATE entry SET data = json_set(data, '$.protect_" +
+                                      std::string(list) + "', json('[2002]'))");
+      };
+      _tag_sharing_login_params params = visit.Params();
+      EXPECT_EQ(-10, TUVO::TuvoSharingLogin(session_id, &params, true)) << list;
+      return 0;
+    });
+    EXPECT_EQ("0", UseCount());
+    EXPECT_EQ("0", Tokens());
+    Change("DELETE FROM entry");
+  }
+}
+
+// Another link may have taken the hash of one that was deleted.
+TEST_F(LinkLogin, ALinkWithAnotherProtectionIsAskedAboutAnew) {
+  const std::string hash = MakeLink();
+  const std::string other = MakePasswordLink();
+  const pid_t owner =
+      StartWriter("DELETE FROM entry WHERE hash = '" + hash + "'; UPDATE entry SET hash = '" +
+                  hash + "' WHERE hash = '" + other + "'");
+  const Reply reply = Login(Visit(hash).Password("wrong"));
+  Join(owner);
+  EXPECT_EQ(-9, reply.code);
+  EXPECT_EQ("0", Value("SELECT SUM(use_count) FROM entry"));
+  EXPECT_EQ(1, FailedLogins());
+}
+
+// Two programs may log one session in at the same time.
+TEST_F(LinkLogin, OneSessionHasOneTokenHoweverManyOfItsLoginsGoOnAtOnce) {
+  const std::string id = LoggedIn(Visit(MakeLink()));
+  const std::string hash = MakeLink();
+  std::vector<pid_t> visitors;
+  for (int visitor = 0; visitor < 8; ++visitor) {
+    visitors.push_back(fork());
+    if (visitors.back() == 0) {
+      const Visit visit = Visit(hash).Session(id);
+      visit.EnterEnvironment();
+      _tag_sharing_login_params params = visit.Params();
+      std::string session_id;
+      _exit(TUVO::TuvoSharingLogin(session_id, &params, true) == 1 ? 0 : 1);
+    }
+  }
+  for (const pid_t visitor : visitors) {
+    Join(visitor);
+  }
+  EXPECT_EQ("2", Tokens());
+  EXPECT_EQ(1, Check(Visit(hash).Session(id)).code);
+  EXPECT_EQ(1, Logout(hash, id).code);
+  EXPECT_EQ(-7, Check(Visit(hash).Session(id)).code);
 }
 
 TEST_F(LinkLogin, WithoutALimitUsesDoNotMatter) {

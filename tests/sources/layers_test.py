@@ -23,8 +23,9 @@ LAYERS = {
     "rows": ("db/{field,row,result}.cpp include/tuvosharing/{field,row,result}.h",
              ["platform", "common"]),
     "connection": (
-        "db/{base_db,condition,run_as}.cpp include/tuvosharing/{base_db,condition}.h "
-        "include/internal/{base_db_private,condition_private,escaped,run_as}.h",
+        "db/{base_db,condition,run_as,write_transaction}.cpp "
+        "include/tuvosharing/{base_db,condition}.h "
+        "include/internal/{base_db_private,condition_private,escaped,run_as,write_transaction}.h",
         ["platform", "common", "rows"],
     ),
     "record": (
