@@ -1,6 +1,7 @@
 // The exported auto-block functions.
 #include <syslog.h>
 #include <tuvoplatform/auto_block.h>
+#include <unistd.h>
 
 #include <cstring>
 #include <exception>
@@ -20,6 +21,7 @@ using tuvo_platform::AutoBlockStore;
 
 constexpr char kStorePath[] = "/usr/tuvo/etc/private/session/autoblock.db";
 constexpr char kConfigPath[] = "/usr/tuvo/etc/autoblock.conf";
+constexpr uid_t kRootUid = 0;
 constexpr uid_t kSystemUid = 1;
 constexpr gid_t kSystemGid = 1;
 constexpr size_t kMaxServiceName = 64;
@@ -34,8 +36,12 @@ int WithStore(const char* ip, int line,
     if (!network) {
       throw std::invalid_argument("not an address");
     }
-    // A process that cannot switch tries as it is, and the file's permissions decide.
+    // A process that cannot switch tries as it is, and the file's permissions decide; root's file
+    // would be closed to everybody else.
     const tuvo_platform::ScopedIdentity system(kSystemUid, kSystemGid);
+    if (!system.ok() && geteuid() == kRootUid) {
+      throw std::runtime_error("cannot become the system's user");
+    }
     AutoBlockStore store(kStorePath);
     return work(&store, *network);
   } catch (const std::exception& error) {

@@ -1,5 +1,6 @@
 // Every call that changes the process's ids fails once.
 #include <json/value.h>
+#include <sys/stat.h>
 #include <tuvosharing/entry_db.h>
 #include <tuvosharing/session_db.h>
 #include <tuvosharing/sharing_db.h>
@@ -74,10 +75,10 @@ class EveryIdentityCall : public EveryCall {
     }
     if (!lost) {
       EXPECT_EQ(ToText(kRoot), ToText(CurrentIds()));
-      // Auto-block goes on as root, and has nothing to say about it.
       const bool switch_logged =
           step.Logged("ERROR: IF_RUN_AS(1, 1)") && step.Logged("failed to run as system");
-      EXPECT_TRUE(switch_logged || answer == 1);
+      // A connection is closed without it, and has nothing to say about that.
+      EXPECT_TRUE(switch_logged || step.Logged("cannot become the system's user") || answer == 1);
     }
     EXPECT_EQ(1, operation()) << "the next one";
     return testing::Test::HasFailure() ? 253 : lost ? kFailedBack : kFailedThere;
@@ -93,6 +94,23 @@ TEST_F(EveryIdentityCall, OfALogin) {
                 },
                 {1, -3, -4});
   EXPECT_LT(0, ended_) << "auto-block ends a process that it cannot bring back";
+}
+
+// A file of root's would be closed to all other programs.
+TEST_F(EveryIdentityCall, OfALoginMakesNoAutoBlockFileOfRoots) {
+  const Visit visit = Visit(MakePasswordLink()).Password("wrong");
+  SweepIdentity(visit,
+                [&] {
+                  std::remove(kAutoBlock);
+                  std::string session_id;
+                  const int answer = LogIn(visit, session_id);
+                  struct stat st {};
+                  if (stat(kAutoBlock, &st) == 0) {
+                    EXPECT_EQ(1U, st.st_uid);
+                  }
+                  return answer == -9 ? 1 : answer;
+                },
+                {1, -3, -4});
 }
 
 TEST_F(EveryIdentityCall, OfACheck) {
