@@ -3,23 +3,33 @@
 
 namespace TUVO::sharing::db {
 
-WriteTransaction::WriteTransaction(BaseDB& db)
-    : db_(db), own_(!db.p_->IsInTransaction() && db.Execute("BEGIN IMMEDIATE")) {}
+bool WriteTransaction::IsOpenIn(const BaseDB& db) {
+  return db.p_->IsInTransaction();
+}
+
+WriteTransaction::WriteTransaction(BaseDB& db, bool joins)
+    : db_(db), joins_(joins), held_(Hold()) {}
 
 WriteTransaction::~WriteTransaction() {
   // Once more: a transaction that a passing fault leaves open would lock everybody out, and take in
   // all that this process writes from now on.
-  for (int tries = 0; tries < 2 && own_ && IsOpen(); ++tries) {
+  for (int tries = 0; tries < 2 && !joins_ && IsOpen(); ++tries) {
     db_.Execute("ROLLBACK");
   }
 }
 
+// A transaction of the caller's may hold nothing yet. Its first statement waits for whoever is
+// writing only when it writes itself: one that reads first is refused at once when it writes later.
+bool WriteTransaction::Hold() {
+  return db_.Execute(joins_ ? "DELETE FROM entry WHERE 0" : "BEGIN IMMEDIATE");
+}
+
 bool WriteTransaction::IsOpen() const {
-  return db_.p_->IsInTransaction();
+  return held_ && IsOpenIn(db_);
 }
 
 bool WriteTransaction::Commit() {
-  return IsOpen() && (!own_ || db_.Commit());
+  return IsOpen() && (joins_ || db_.Commit());
 }
 
 }  // namespace TUVO::sharing::db

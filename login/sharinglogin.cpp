@@ -1,5 +1,6 @@
 // The four operations of the login API. They live in one file because the log lines of all name it.
 #include <internal/contained.h>
+#include <internal/entry_alike.h>
 #include <internal/log.h>
 #include <internal/user_access.h>
 #include <internal/write_transaction.h>
@@ -12,7 +13,6 @@
 
 #include <ctime>
 #include <limits>
-#include <optional>
 #include <string>
 #include <utility>
 
@@ -142,172 +142,201 @@ bool IsUsedUp(const Entry& entry) {
   return entry.get_expire_times() > 0 && entry.get_use_count() >= entry.get_expire_times();
 }
 
-// Whether whoever is let in by one link is by the other: the same link, in force for the same time
-// and protected in the same way.
-bool AdmitAlike(const Entry& one, const Entry& other) {
-  return one.get_id() == other.get_id() && one.get_enabled() == other.get_enabled() &&
-         one.get_start_at() == other.get_start_at() &&
-         one.get_expire_at() == other.get_expire_at() &&
-         one.get_protect_type() == other.get_protect_type() &&
-         one.get_protect_password() == other.get_protect_password() &&
-         one.get_protect_uids() == other.get_protect_uids() &&
-         one.get_protect_gids() == other.get_protect_gids();
-}
-
-enum class Count {
-  kDone,
-  kFailed,
-  kUsedUp,   // nothing was written
-  kChanged,  // nothing was written: the link that let the visitor in is not there any more
-};
-
-// `admitting` is the link as it let the visitor in; null for a caller who has decided already.
-Count CountUse(EntryDB& entries, const std::string& hash, const Entry* admitting) {
-  Entry entry;
-  if (!entries.GetByHash(hash, entry)) {
-    entries.GetCondition().Where("hash", hash);
-    return admitting != nullptr && HasNone(entries) ? Count::kChanged : Count::kFailed;
-  }
-  if (admitting != nullptr && !AdmitAlike(entry, *admitting)) {
-    return Count::kChanged;
-  }
-  if (admitting != nullptr && IsUsedUp(entry)) {
-    return Count::kUsedUp;
-  }
-  entry.inc_use_count();
-  return entries.Update(entry) ? Count::kDone : Count::kFailed;
-}
-
+// Reads the link, raises its count and writes it back as a whole: without the file held, what its
+// owner, or a login, writes in between would be undone, a link that was just switched off would be
+// on again.
 bool IncreaseUseCount(const std::string& hash) {
   SharingDB& db = SharingDB::Instance();
   if (!db.IsGood()) {
     return false;
   }
   EntryDB entries(db);  // checkpoints when the transaction is over
-  // The whole link is read and written back: what its owner, or a login, writes in between would be
-  // undone, a link that was just switched off would be on again.
-  WriteTransaction transaction(db);
-  return transaction.IsOpen() && CountUse(entries, hash, nullptr) == Count::kDone &&
-         transaction.Commit();
-}
-
-// Session and token of a visitor who is past the link's protection. On failure `token` is what
-// there is to take back.
-bool Admit(SharingDB& db, const WriteTransaction& transaction, SessionDB& sessions, TokenDB& tokens,
-           const Entry& entry, const char* sharing_sid, unsigned int uid, Token& token,
-           std::string& session_id) {
-  Session session;
-  std::string ip;
-  if (!db.IsGood() || !GetRemoteIP(ip) || !TakeSession(sessions, sharing_sid, ip, session) ||
-      !TakeToken(transaction, tokens, session, entry, token)) {
+  WriteTransaction transaction(db, WriteTransaction::IsOpenIn(db));
+  Entry entry;
+  if (!transaction.IsOpen() || !entries.GetByHash(hash, entry)) {
     return false;
   }
-  if (entry.get_protect_type() == Entry::PROTECT_USER) {
-    session.set_uid(uid);
-  }
-  session_id = session.get_session_id();
-  return sessions.Update(session);
+  entry.inc_use_count();
+  return entries.Update(entry) && transaction.Commit();
 }
 
-void LogUncounted() {
-  SHARING_LOG("update entry use count fail");
-}
+// One visitor's login, from the look at the link to the token. Where the link changes meanwhile it
+// begins anew.
+class LinkLogin {
+ public:
+  LinkLogin(SharingDB& db, const _tag_sharing_login_params* params, bool skip_autoblock)
+      : db_(db),
+        params_(params),
+        skip_autoblock_(skip_autoblock),
+        joins_(WriteTransaction::IsOpenIn(db)) {}
 
-// Counts the use and lets the visitor in. All of it holds the file, so that nothing comes in
-// between: other visitors may have taken the last uses since the link was read, and its owner may
-// have changed it and signed everybody out.
-int CountAndAdmit(SharingDB& db, const Entry& entry, const _tag_sharing_login_params* params,
-                  unsigned int uid, std::string& session_id) {
-  EntryDB entries(db);  // these checkpoint when the transaction is over
-  SessionDB sessions(db);
-  TokenDB tokens(db);
-  std::optional<WriteTransaction> transaction(std::in_place, db);
-  const auto count = [&] { return CountUse(entries, params->sharing_id, &entry); };
-  bool counted = false;
-  switch (transaction->IsOpen() ? Contained(count, Count::kFailed) : Count::kFailed) {
-    case Count::kDone:
-      counted = true;
-      break;
-    case Count::kUsedUp:
-      return kUsedUp;
-    case Count::kChanged:
-      return kLinkChanged;
-    case Count::kFailed:
-      LogUncounted();
-      transaction.emplace(db);  // takes back what there is of the failed one
-  }
-  Token token;
-  std::string text;
-  const auto admit = [&] {
-    return transaction->IsOpen() &&
-           Admit(db, *transaction, sessions, tokens, entry, params->sharing_sid, uid, token, text);
-  };
-  const bool admitted = Contained(admit);
-  // Whoever is not admitted has used the link all the same. A token of a transaction that is gone
-  // is gone with it, and its number may be somebody else's by now.
-  if (!admitted && transaction->IsOpen()) {
-    tokens.Delete(token);
-  }
-  if (!transaction->Commit()) {
-    if (counted) {
-      LogUncounted();
+  int Run(std::string& session_id) {
+    // So that nobody writes between the look at the link and the count.
+    if (joins_ && !WriteTransaction(db_, joins_).IsOpen()) {
+      return kFailed;
+    }
+    constexpr int kMostChanges = 10;
+    for (int changes = 0; changes < kMostChanges; ++changes) {
+      const int result = LogIn(session_id);
+      if (result != kLinkChanged) {
+        return result;
+      }
     }
     return kFailed;
   }
-  if (!admitted) {
-    return kFailed;
-  }
-  session_id = std::move(text);
-  return kSuccess;
-}
 
-// kLinkChanged when it has to be done again.
-int TryLogin(std::string& session_id, const _tag_sharing_login_params* params,
-             bool skip_autoblock) {
+ private:
+  enum class Use {
+    kToCount,
+    kCounted,
+    kUncountable,  // which was logged
+  };
+
+  int LogIn(std::string& session_id) {
+    std::string ip;
+    if (!GetRemoteIP(ip)) {
+      return kFailed;
+    }
+    if (TuvoCgiIsDeniedIP(ip.c_str()) == 1) {
+      SHARING_LOG("TuvoAutoBlockIsDeniedIP %s", ip.c_str());
+      return kAddress;
+    }
+    EntryDB entries(db_);
+    Entry entry;
+    if (!entries.GetByHash(params_->sharing_id, entry) || !entry.IsValid()) {
+      return kNoValidLink;
+    }
+    if (entry.get_id() != link_) {
+      link_ = entry.get_id();
+      use_ = Use::kToCount;
+    }
+    if (use_ != Use::kCounted && IsUsedUp(entry)) {
+      return kUsedUp;
+    }
+    unsigned int uid = kNoUid;
+    const int protection = CheckProtection(entry, params_, uid);
+    if (protection != kSuccess) {
+      // A caller that skips the auto-block does not hold it against an account that it is not
+      // listed; a wrong password counts in any case.
+      if (protection != kAccountNotListed || !skip_autoblock_) {
+        AutoBlockFailLoginSet(ip.c_str(), kService);
+      }
+      return protection;
+    }
+    int admission = Contained([&] { return CountUse(entry); }, int{kSuccess});
+    if (admission == kSuccess) {
+      admission = Admit(entries, entry, uid, session_id);
+    }
+    if (admission == kSuccess && !skip_autoblock_) {
+      TUVOAutoBlockFailLoginReset(ip.c_str());
+    }
+    return admission;
+  }
+
+  // Decides again, with the file held, for a visitor whom `link` let in: other visitors may have
+  // taken the last uses since it was read, and its owner may have changed it and signed everybody
+  // out.
+  int JudgeAgain(const EntryDB& entries, const Entry& link, Entry& now) const {
+    if (!entries.GetByHash(params_->sharing_id, now) || !AdmitAlike(now, link)) {
+      return kLinkChanged;
+    }
+    return use_ != Use::kCounted && IsUsedUp(now) ? kUsedUp : kSuccess;
+  }
+
+  void NoteUse(bool counted) {
+    use_ = counted ? Use::kCounted : Use::kUncountable;
+    if (!counted) {
+      SHARING_LOG("update entry use count fail");
+    }
+  }
+
+  // Leaves the use to be counted with the admission when the file could not be had.
+  int CountUse(const Entry& link) {
+    EntryDB entries(db_);  // checkpoints when the transaction is over
+    WriteTransaction transaction(db_, joins_);
+    if (use_ != Use::kToCount || !transaction.IsOpen()) {
+      return kSuccess;
+    }
+    Entry entry;
+    const int verdict = JudgeAgain(entries, link, entry);
+    if (verdict != kSuccess) {
+      return verdict;
+    }
+    entry.inc_use_count();
+    NoteUse(entries.Update(entry) && transaction.Commit());
+    return use_ == Use::kUncountable && joins_ ? kFailed : kSuccess;
+  }
+
+  // Makes session and token, in one transaction: one session must not get two tokens, nor anybody a
+  // token behind the sign-out of all.
+  int Admit(EntryDB& entries, const Entry& link, unsigned int uid, std::string& session_id) {
+    SessionDB sessions(db_);
+    TokenDB tokens(db_);
+    WriteTransaction transaction(db_, joins_);
+    if (!transaction.IsOpen()) {
+      if (use_ == Use::kToCount) {
+        NoteUse(false);
+      }
+      return kFailed;
+    }
+    Entry entry;
+    const int verdict = JudgeAgain(entries, link, entry);
+    if (verdict != kSuccess) {
+      return verdict;
+    }
+    if (use_ == Use::kToCount) {
+      entry.inc_use_count();
+      NoteUse(entries.Update(entry));
+    }
+    Token token;
+    std::string text;
+    const bool admitted = Contained([&] {
+      return transaction.IsOpen() &&
+             TakeBoth(transaction, sessions, tokens, link, uid, token, text);
+    });
+    // A token of a transaction that is gone is gone with it, and its number may be somebody else's
+    // by now.
+    if (!admitted && transaction.IsOpen()) {
+      tokens.Delete(token);
+    }
+    if (!transaction.Commit() || !admitted) {
+      return kFailed;
+    }
+    session_id = std::move(text);
+    return kSuccess;
+  }
+
+  // On failure `token` is what there is to take back.
+  bool TakeBoth(const WriteTransaction& transaction, SessionDB& sessions, TokenDB& tokens,
+                const Entry& link, unsigned int uid, Token& token, std::string& text) const {
+    Session session;
+    std::string ip;
+    if (!db_.IsGood() || !GetRemoteIP(ip) ||
+        !TakeSession(sessions, params_->sharing_sid, ip, session) ||
+        !TakeToken(transaction, tokens, session, link, token)) {
+      return false;
+    }
+    if (link.get_protect_type() == Entry::PROTECT_USER) {
+      session.set_uid(uid);
+    }
+    text = session.get_session_id();
+    return sessions.Update(session);
+  }
+
+  SharingDB& db_;
+  const _tag_sharing_login_params* const params_;
+  const bool skip_autoblock_;
+  const bool joins_;
+  int link_ = 0;
+  Use use_ = Use::kToCount;
+};
+
+int Login(std::string& session_id, const _tag_sharing_login_params* params, bool skip_autoblock) {
   SharingDB& db = SharingDB::Instance();
   if (params == nullptr || !db.IsGood() || params->sharing_id == nullptr) {
     return kFailed;
   }
-  std::string ip;
-  if (!GetRemoteIP(ip)) {
-    return kFailed;
-  }
-  if (TuvoCgiIsDeniedIP(ip.c_str()) == 1) {
-    SHARING_LOG("TuvoAutoBlockIsDeniedIP %s", ip.c_str());
-    return kAddress;
-  }
-  const EntryDB entries(db);
-  Entry entry;
-  if (!entries.GetByHash(params->sharing_id, entry) || !entry.IsValid()) {
-    return kNoValidLink;
-  }
-  if (IsUsedUp(entry)) {
-    return kUsedUp;
-  }
-  unsigned int uid = kNoUid;
-  const int protection = CheckProtection(entry, params, uid);
-  if (protection != kSuccess) {
-    // A caller that skips the auto-block does not hold it against an account that it is not listed;
-    // a wrong password counts in any case.
-    if (protection != kAccountNotListed || !skip_autoblock) {
-      AutoBlockFailLoginSet(ip.c_str(), kService);
-    }
-    return protection;
-  }
-  const int admission = CountAndAdmit(db, entry, params, uid, session_id);
-  if (admission == kSuccess && !skip_autoblock) {
-    TUVOAutoBlockFailLoginReset(ip.c_str());
-  }
-  return admission;
-}
-
-int Login(std::string& session_id, const _tag_sharing_login_params* params, bool skip_autoblock) {
-  for (;;) {
-    const int result = TryLogin(session_id, params, skip_autoblock);
-    if (result != kLinkChanged) {
-      return result;
-    }
-  }
+  return LinkLogin(db, params, skip_autoblock).Run(session_id);
 }
 
 int IsAuthorized(const _tag_sharing_login_params* params) {

@@ -36,6 +36,7 @@ class EntryPrivate : public Object {
 
  private:
   friend class Entry;
+  friend bool AdmitAlike(const Entry& one, const Entry& other);
 
   // The "data" column: every field from enable_match_ip_ on, as one JSON object. Reading sets all
   // of them, or none and answers false when a member is of the wrong JSON type.

@@ -5,11 +5,16 @@
 
 namespace TUVO::sharing::db {
 
-// Holds a database file for writing until it is committed or taken back, at the latest with this
-// object. Within a transaction of the caller's own this is none, and that one decides.
+// Holds the sharing database for writing until it is committed or taken back, at the latest with
+// this object.
 class WriteTransaction {
  public:
-  explicit WriteTransaction(BaseDB& db);
+  // Whether a transaction is open: at the beginning of an operation, one of the caller's own.
+  static bool IsOpenIn(const BaseDB& db);
+
+  // `joins` when the caller has a transaction open, which then decides over all that is written.
+  // Waits for the file; in vain, when the caller has read before and somebody else writes.
+  WriteTransaction(BaseDB& db, bool joins);
   WriteTransaction(const WriteTransaction&) = delete;
   WriteTransaction& operator=(const WriteTransaction&) = delete;
   ~WriteTransaction();
@@ -23,8 +28,11 @@ class WriteTransaction {
   bool Commit();
 
  private:
+  bool Hold();
+
   BaseDB& db_;
-  bool own_;
+  const bool joins_;
+  const bool held_;
 };
 
 }  // namespace TUVO::sharing::db

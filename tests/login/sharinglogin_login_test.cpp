@@ -2,8 +2,10 @@
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <tuvoplatform/auto_block.h>
+#include <tuvosharing/sharing_db.h>
 #include <unistd.h>
 
+#include <chrono>
 #include <cstdlib>
 #include <cstring>
 #include <filesystem>
@@ -364,6 +366,8 @@ TEST_F(LinkLogin, WhoIsLetInByALinkThatIsChangedMeanwhileIsJudgedByTheNewOne) {
        "'\"protect_password\":\"f')",
        -9},
       {"DELETE FROM entry", -3},
+      {"UPDATE entry SET project_name = ''", -3},
+      {"UPDATE entry SET data = '{'", -3},
       {"UPDATE entry SET id = id + 100", 1},
       {"UPDATE entry SET auto_gc = 1, owner_uid = 2002", 1},
   };
@@ -402,6 +406,45 @@ TEST_F(LinkLogin, WhoIsListedNoMoreWhenTheUseIsCountedIsRefused) {
     EXPECT_EQ("0", Tokens());
     Change("DELETE FROM entry");
   }
+}
+
+// The counting gives up after ten seconds, and what is decided then is decided behind the other.
+TEST_F(LinkLogin, ALimitHoldsWhenTheFileStaysLocked) {
+  const std::string hash = MakeLimitedLink(3, 1);
+  const pid_t other =
+      StartWriter("UPDATE entry SET use_count = 2", std::chrono::milliseconds(11000));
+  const Reply reply = Login(Visit(hash));
+  Join(other);
+  EXPECT_EQ(1, reply.code);
+  EXPECT_EQ(Lines{}, reply.log);
+  EXPECT_EQ("3", UseCount());
+}
+
+TEST_F(LinkLogin, ALimitHoldsForLoginsWithinTransactionsOfTheCallers) {
+  const std::string hash = MakeLimitedLink(5);
+  std::vector<pid_t> visitors;
+  for (int visitor = 0; visitor < 8; ++visitor) {
+    visitors.push_back(fork());
+    if (visitors.back() == 0) {
+      const Visit visit(hash);
+      visit.EnterEnvironment();
+      TUVO::sharing::db::SharingDB& db = TUVO::sharing::db::SharingDB::Instance();
+      bool as_wanted = true;
+      for (int login = 0; login < 5; ++login) {
+        _tag_sharing_login_params params = visit.Params();
+        std::string session_id;
+        as_wanted = db.Begin() && as_wanted;
+        const int code = TUVO::TuvoSharingLogin(session_id, &params, true);
+        as_wanted = (code == 1 || code == -11) && db.Commit() && as_wanted;
+      }
+      _exit(as_wanted ? 0 : 1);
+    }
+  }
+  for (const pid_t visitor : visitors) {
+    Join(visitor);
+  }
+  EXPECT_EQ("5", UseCount());
+  EXPECT_EQ("5", Tokens());
 }
 
 // Another link may have taken the hash of one that was deleted.

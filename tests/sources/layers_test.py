@@ -23,14 +23,13 @@ LAYERS = {
     "rows": ("db/{field,row,result}.cpp include/tuvosharing/{field,row,result}.h",
              ["platform", "common"]),
     "connection": (
-        "db/{base_db,condition,run_as,write_transaction}.cpp "
-        "include/tuvosharing/{base_db,condition}.h "
-        "include/internal/{base_db_private,condition_private,escaped,run_as,write_transaction}.h",
+        "db/{base_db,condition,run_as}.cpp include/tuvosharing/{base_db,condition}.h "
+        "include/internal/{base_db_private,condition_private,escaped,run_as}.h",
         ["platform", "common", "rows"],
     ),
     "record": (
         "record/* include/tuvosharing/{object,entry,session,token}.h "
-        "include/internal/{entry,session,token}_private.h",
+        "include/internal/{entry,session,token}_private.h include/internal/entry_alike.h",
         ["platform", "common", "rows"],
     ),
     "generic store": (
@@ -39,7 +38,8 @@ LAYERS = {
         ["common", "rows", "connection", "record"],
     ),
     "database": (
-        "db/sharing_db.cpp include/tuvosharing/sharing_db.h include/internal/sharing_db_private.h",
+        "db/{sharing_db,write_transaction}.cpp include/tuvosharing/sharing_db.h "
+        "include/internal/{sharing_db_private,write_transaction}.h",
         ["common", "rows", "connection"],
     ),
     "stores": (
