@@ -160,6 +160,11 @@ bool IncreaseUseCount(const std::string& hash) {
   return entries.Update(entry) && transaction.Commit();
 }
 
+bool InForceAlike(const Entry& one, const Entry& other) {
+  return one.get_enabled() == other.get_enabled() && one.get_start_at() == other.get_start_at() &&
+         one.get_expire_at() == other.get_expire_at();
+}
+
 // One visitor's login, from the look at the link to the token. Where the link changes meanwhile it
 // begins anew.
 class LinkLogin {
@@ -237,10 +242,16 @@ class LinkLogin {
   // taken the last uses since it was read, and its owner may have changed it and signed everybody
   // out.
   int JudgeAgain(const EntryDB& entries, const Entry& link, Entry& now) const {
-    if (!entries.GetByHash(params_->sharing_id, now) || !AdmitAlike(now, link)) {
+    if (!entries.GetByHash(params_->sharing_id, now) || !ProtectAlike(now, link)) {
       return kLinkChanged;
     }
-    return use_ != Use::kCounted && IsUsedUp(now) ? kUsedUp : kSuccess;
+    if (use_ == Use::kCounted) {  // it came before the link was switched off, or ended
+      return kSuccess;
+    }
+    if (!InForceAlike(now, link)) {
+      return kLinkChanged;
+    }
+    return IsUsedUp(now) ? kUsedUp : kSuccess;
   }
 
   void NoteUse(bool counted) {

@@ -3,11 +3,10 @@
 
 namespace TUVO::sharing::record {
 
-bool AdmitAlike(const Entry& one, const Entry& other) {
+bool ProtectAlike(const Entry& one, const Entry& other) {
   const EntryPrivate& a = *one.p_;
   const EntryPrivate& b = *other.p_;
-  return one.get_id() == other.get_id() && a.enabled_ == b.enabled_ && a.start_at_ == b.start_at_ &&
-         a.expire_at_ == b.expire_at_ && a.protect_type_ == b.protect_type_ &&
+  return one.get_id() == other.get_id() && a.protect_type_ == b.protect_type_ &&
          a.protect_password_ == b.protect_password_ && a.protect_uids_ == b.protect_uids_ &&
          a.protect_extra_users_ == b.protect_extra_users_ && a.protect_gids_ == b.protect_gids_ &&
          a.protect_extra_groups_ == b.protect_extra_groups_;

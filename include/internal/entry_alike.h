@@ -5,10 +5,9 @@
 
 namespace TUVO::sharing::record {
 
-// Whether whoever is let in by one link is by the other: the same link, in force for the same time
-// and protected in the same way. Account names without an id are compared as such, and not looked
-// up.
-bool AdmitAlike(const Entry& one, const Entry& other);
+// Whether they are the same link, protected in the same way. Account names without an id are
+// compared as such, and not looked up.
+bool ProtectAlike(const Entry& one, const Entry& other);
 
 }  // namespace TUVO::sharing::record
 

@@ -170,7 +170,7 @@ class TUVOSHARING_API Entry {
   Entry& set_private_data(const Json::Value& private_data);
 
  private:
-  friend bool AdmitAlike(const Entry& one, const Entry& other);
+  friend bool ProtectAlike(const Entry& one, const Entry& other);
 
   std::unique_ptr<EntryPrivate> p_;
 };
