@@ -8,7 +8,20 @@ target_include_directories(tuvosharing_objects PUBLIC "${PROJECT_SOURCE_DIR}/inc
 target_link_libraries(
   tuvosharing_objects
   PUBLIC tuvo_platform PkgConfig::JSONCPP
-  PRIVATE tuvo_options PkgConfig::SQLITE3 PkgConfig::LIBGCRYPT OpenSSL::Crypto)
+  PRIVATE tuvo_options PkgConfig::SQLITE3 ${CMAKE_DL_LIBS})
+
+# The digests' libraries are loaded when a digest is made (include/internal/late_library.h), so only
+# their headers and names are needed here.
+find_library(GCRYPT_LIBRARY gcrypt HINTS ${LIBGCRYPT_LIBRARY_DIRS} REQUIRED)
+tuvo_soname(libgcrypt_soname "${GCRYPT_LIBRARY}")
+tuvo_soname(libcrypto_soname "${OPENSSL_CRYPTO_LIBRARY}")
+target_include_directories(tuvosharing_objects SYSTEM PRIVATE ${LIBGCRYPT_INCLUDE_DIRS}
+                                                              ${OPENSSL_INCLUDE_DIR})
+set_source_files_properties(
+  "${PROJECT_SOURCE_DIR}/utils/password_hash.cpp"
+  PROPERTIES
+    COMPILE_DEFINITIONS
+    "TUVO_LIBCRYPTO_SONAME=\"${libcrypto_soname}\";TUVO_LIBGCRYPT_SONAME=\"${libgcrypt_soname}\"")
 
 set(version_script "${PROJECT_SOURCE_DIR}/cmake/tuvosharing.map")
 add_library(tuvosharing SHARED $<TARGET_OBJECTS:tuvosharing_objects>)
@@ -22,8 +35,10 @@ target_include_directories(
 target_link_libraries(
   tuvosharing
   PUBLIC PkgConfig::JSONCPP
-  PRIVATE tuvo_options tuvo_platform PkgConfig::SQLITE3 PkgConfig::LIBGCRYPT OpenSSL::Crypto)
-target_link_options(tuvosharing PRIVATE "-Wl,--version-script=${version_script}")
+  PRIVATE tuvo_options tuvo_platform PkgConfig::SQLITE3 ${CMAKE_DL_LIBS})
+# The library's calls of its own exported functions need no look-up at every start.
+target_link_options(tuvosharing PRIVATE "-Wl,--version-script=${version_script}"
+                                        -Wl,-Bsymbolic-functions)
 
 configure_file("${PROJECT_SOURCE_DIR}/cmake/tuvosharing.pc.in" tuvosharing.pc @ONLY)
 configure_package_config_file(

@@ -1,7 +1,8 @@
+#include <internal/constant_time.h>
 #include <internal/entry_private.h>
 #include <internal/log.h>
+#include <internal/row_values.h>
 #include <internal/time_text.h>
-#include <openssl/crypto.h>
 #include <tuvoplatform/random.h>
 #include <tuvosharing/keys.h>
 #include <tuvosharing/row.h>
@@ -90,11 +91,6 @@ const char* PublicText(Entry::RedirectType type) {
   }
 }
 
-// Answers do not take longer the more of a wrong password's digest is right.
-bool AreEqual(const std::string& a, const std::string& b) {
-  return a.size() == b.size() && CRYPTO_memcmp(a.data(), b.data(), a.size()) == 0;
-}
-
 }  // namespace
 
 std::vector<std::string> EntryPrivate::GetFieldList() const {
@@ -158,7 +154,8 @@ bool EntryPrivate::IsPasswordValid(const std::string& password) const {
   const bool hashed = protect_password_algo_ == Entry::ENCRYPT_ALGO_DEFAULT
                           ? Sha1WithSaltHashPassword(password, protect_password_salt_, digest)
                           : MD5HashPassword(password, digest);
-  return hashed && AreEqual(digest, protect_password_);
+  // Answers do not take longer the more of a wrong password's digest is right.
+  return hashed && internal::AreEqualInConstantTime(digest, protect_password_);
 }
 
 void EntryPrivate::SetProtectPassword(const std::string& password, bool hash,
@@ -238,22 +235,23 @@ void EntryPrivate::ToJSON(Json::Value& value) const {
 }
 
 bool EntryPrivate::FromRow(const db::Row& row) {
+  const db::RowValues values(row);
   // So that a row that memory does not suffice for changes nothing: half of it would be a link
   // without its protection.
   EntryPrivate read(*this);
-  read.id_ = row.GetField(SZK_ID_).AsInt(0);
-  read.key_ = row.GetField(SZK_HASH).AsString("");
-  read.project_name_ = row.GetField(SZK_PROJECT_NAME).AsString("");
-  db::Field enabled = row.GetField(SZK_ENABLED_);
+  read.id_ = values.Int(SZK_ID_, 0);
+  read.key_ = values.Text(SZK_HASH);
+  read.project_name_ = values.Text(SZK_PROJECT_NAME);
+  const std::string enabled = values.Text(SZK_ENABLED_);
   // A row without the value is a link that nobody switched off.
-  read.enabled_ = enabled.AsString("").empty() || enabled.AsBool(true);
-  read.owner_uid_ = row.GetField(SZK_OWNER_UID).AsUInt(UID_ERR);
-  read.start_at_ = row.GetField(SZK_START_AT).AsTime(0);
-  read.expire_at_ = row.GetField(SZK_EXPIRE_AT).AsTime(0);
-  read.expire_times_ = row.GetField(SZK_EXPIRE_TIMES).AsInt(0);
-  read.use_count_ = row.GetField(SZK_USE_COUNT).AsInt(0);
-  read.auto_gc_ = row.GetField(SZK_AUTO_GC).AsInt(0) != 0;
-  const bool has_data = read.DataFromText(row.GetField(SZK_DATA).AsString(""));
+  read.enabled_ = enabled.empty() || enabled == "1";
+  read.owner_uid_ = values.UInt(SZK_OWNER_UID, UID_ERR);
+  read.start_at_ = values.Time(SZK_START_AT, 0);
+  read.expire_at_ = values.Time(SZK_EXPIRE_AT, 0);
+  read.expire_times_ = values.Int(SZK_EXPIRE_TIMES, 0);
+  read.use_count_ = values.Int(SZK_USE_COUNT, 0);
+  read.auto_gc_ = values.Int(SZK_AUTO_GC, 0) != 0;
+  const bool has_data = read.DataFromText(values.Text(SZK_DATA));
   *this = std::move(read);
   return has_data && IsLegal();
 }

@@ -123,33 +123,56 @@ bool EntryPrivate::DataFromText(const std::string& text) {
   return TextToJson(text, data) && data.isObject() && DataFromJson(data);
 }
 
-bool EntryPrivate::DataFromJson(const Json::Value& data) {
-  // Read into a copy, so that a document that cannot be read changes nothing.
-  EntryPrivate read(*this);
+bool EntryPrivate::DataFromJson(Json::Value& data) {
+  // Read beside what is there, so that a document that cannot be read changes nothing.
+  const Json::Value& members = data;  // a look at what is missing must not make it
+  bool enable_match_ip = false;
   std::string protect_type;
-  std::string algo;
+  std::string protect_title;
+  std::string protect_password;
+  std::string protect_password_algo;
+  std::string protect_password_salt;
+  std::vector<unsigned int> protect_uids;
+  std::vector<std::string> protect_extra_users;
+  std::vector<unsigned int> protect_gids;
+  std::vector<std::string> protect_extra_groups;
   std::string redirect_type;
-  if (!Read(data[SZK_ENABLE_MATCH_IP], read.enable_match_ip_) ||
-      !Read(data[SZK_PROTECT_TYPE], protect_type) ||
-      !Read(data[SZK_PROTECT_TITLE], read.protect_title_) ||
-      !Read(data[SZK_PROTECT_PASSWORD], read.protect_password_) ||
-      !Read(data[SZK_PROTECT_PASSWORD_ALGO], algo) ||
-      !Read(data[SZK_PROTECT_PASSWORD_SALT], read.protect_password_salt_) ||
-      !Read(data[SZK_PROTECT_UIDS], read.protect_uids_) ||
-      !Read(data[SZK_PROTECT_EXTRA_USERS], read.protect_extra_users_) ||
-      !Read(data[SZK_PROTECT_GIDS], read.protect_gids_) ||
-      !Read(data[SZK_PROTECT_EXTRA_GROUPS], read.protect_extra_groups_) ||
-      !Read(data[SZK_REDIRECT_TYPE], redirect_type) ||
-      !Read(data[SZK_REDIRECT_URI], read.redirect_uri_)) {
+  std::string redirect_uri;
+  if (!Read(members[SZK_ENABLE_MATCH_IP], enable_match_ip) ||
+      !Read(members[SZK_PROTECT_TYPE], protect_type) ||
+      !Read(members[SZK_PROTECT_TITLE], protect_title) ||
+      !Read(members[SZK_PROTECT_PASSWORD], protect_password) ||
+      !Read(members[SZK_PROTECT_PASSWORD_ALGO], protect_password_algo) ||
+      !Read(members[SZK_PROTECT_PASSWORD_SALT], protect_password_salt) ||
+      !Read(members[SZK_PROTECT_UIDS], protect_uids) ||
+      !Read(members[SZK_PROTECT_EXTRA_USERS], protect_extra_users) ||
+      !Read(members[SZK_PROTECT_GIDS], protect_gids) ||
+      !Read(members[SZK_PROTECT_EXTRA_GROUPS], protect_extra_groups) ||
+      !Read(members[SZK_REDIRECT_TYPE], redirect_type) ||
+      !Read(members[SZK_REDIRECT_URI], redirect_uri)) {
     return false;
   }
-  read.protect_type_ = ToProtectType(protect_type);
-  read.protect_password_algo_ = ToPasswordEncryptAlgo(algo);
-  read.redirect_type_ = ToRedirectType(redirect_type);
-  read.app_ = data[SZK_APP];
-  read.private_data_ =
-      data.isMember(SZK_PRIVATE_DATA) ? data[SZK_PRIVATE_DATA] : Json::Value(Json::objectValue);
-  *this = std::move(read);
+  Json::Value private_data(Json::objectValue);
+  if (data.isMember(SZK_PRIVATE_DATA)) {
+    private_data.swap(data[SZK_PRIVATE_DATA]);
+  }
+  Json::Value app;
+  app.swap(data[SZK_APP]);
+  // Nothing below needs memory.
+  enable_match_ip_ = enable_match_ip;
+  protect_type_ = ToProtectType(protect_type);
+  protect_title_ = std::move(protect_title);
+  protect_password_ = std::move(protect_password);
+  protect_password_algo_ = ToPasswordEncryptAlgo(protect_password_algo);
+  protect_password_salt_ = std::move(protect_password_salt);
+  protect_uids_ = std::move(protect_uids);
+  protect_extra_users_ = std::move(protect_extra_users);
+  protect_gids_ = std::move(protect_gids);
+  protect_extra_groups_ = std::move(protect_extra_groups);
+  redirect_type_ = ToRedirectType(redirect_type);
+  redirect_uri_ = std::move(redirect_uri);
+  app_.swap(app);
+  private_data_.swap(private_data);
   return true;
 }
 

@@ -1,4 +1,5 @@
 #include <internal/log.h>
+#include <internal/row_values.h>
 #include <internal/session_private.h>
 #include <json/value.h>
 #include <tuvosharing/keys.h>
@@ -41,12 +42,13 @@ void SessionPrivate::ToJSON(Json::Value& value) const {
 }
 
 bool SessionPrivate::FromRow(const db::Row& row) {
+  const db::RowValues values(row);
   SessionPrivate read(*this);  // so that a row that memory does not suffice for changes nothing
-  read.id_ = row.GetField(SZK_ID_).AsInt(0);
-  read.key_ = row.GetField(SZK_SESSION_ID_).AsString("");
-  read.uid_ = row.GetField(SZK_UID_).AsUInt(UID_ERR);
-  read.ip_ = row.GetField(SZK_IP_).AsString("");
-  read.timeout_ = row.GetField(SZK_TIMEOUT).AsTime(0);
+  read.id_ = values.Int(SZK_ID_, 0);
+  read.key_ = values.Text(SZK_SESSION_ID_);
+  read.uid_ = values.UInt(SZK_UID_, UID_ERR);
+  read.ip_ = values.Text(SZK_IP_);
+  read.timeout_ = values.Time(SZK_TIMEOUT, 0);
   *this = std::move(read);
   return IsLegal();
 }

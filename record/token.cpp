@@ -1,4 +1,5 @@
 #include <internal/log.h>
+#include <internal/row_values.h>
 #include <internal/token_private.h>
 #include <json/value.h>
 #include <tuvosharing/keys.h>
@@ -37,11 +38,12 @@ void TokenPrivate::ToJSON(Json::Value& value) const {
 }
 
 bool TokenPrivate::FromRow(const db::Row& row) {
+  const db::RowValues values(row);
   TokenPrivate read(*this);  // so that a row that memory does not suffice for changes nothing
-  read.id_ = row.GetField(SZK_ID_).AsInt(0);
-  read.entry_id_ = row.GetField(SZK_ENTRY_ID).AsInt(0);
-  read.session_id_ = row.GetField(SZK_SESSION_ID_).AsInt(0);
-  read.timeout_ = row.GetField(SZK_TIMEOUT).AsTime(0);
+  read.id_ = values.Int(SZK_ID_, 0);
+  read.entry_id_ = values.Int(SZK_ENTRY_ID, 0);
+  read.session_id_ = values.Int(SZK_SESSION_ID_, 0);
+  read.timeout_ = values.Time(SZK_TIMEOUT, 0);
   *this = std::move(read);
   return IsLegal();
 }

@@ -2,6 +2,7 @@
 #include <json/reader.h>
 #include <json/writer.h>
 
+#include <atomic>
 #include <cstring>
 #include <memory>
 #include <new>
@@ -34,11 +35,36 @@ Json::CharReaderBuilder Reader() {
   return builder;
 }
 
+// Making a reader or writer takes as long as a short document does, so one of each is kept. Both
+// begin every document anew, also after one that they threw at. Whoever comes while another thread
+// has it makes one more.
+template <typename Tool>
+class Lent {
+ public:
+  Lent(std::atomic<Tool*>& spare, Tool* (*make)()) : spare_(spare), tool_(spare.exchange(nullptr)) {
+    if (!tool_) {
+      tool_.reset(make());
+    }
+  }
+  ~Lent() { tool_.reset(spare_.exchange(tool_.release())); }
+  Lent(const Lent&) = delete;
+  Lent& operator=(const Lent&) = delete;
+
+  Tool* operator->() const { return tool_.get(); }
+
+ private:
+  std::atomic<Tool*>& spare_;
+  std::unique_ptr<Tool> tool_;
+};
+
+std::atomic<Json::CharReader*> spare_reader{nullptr};
+std::atomic<Json::StreamWriter*> spare_writer{nullptr};
+
 }  // namespace
 
 std::string JsonToText(const Json::Value& value) {
-  static const Json::StreamWriterBuilder builder = CompactWriter();
-  const std::unique_ptr<Json::StreamWriter> writer(builder.newStreamWriter());
+  const Lent<Json::StreamWriter> writer(
+      spare_writer, +[] { return CompactWriter().newStreamWriter(); });
   std::ostringstream text;
   // Or memory that runs out in the middle would leave the rest away without a word.
   text.exceptions(std::ios_base::badbit);
@@ -47,8 +73,8 @@ std::string JsonToText(const Json::Value& value) {
 }
 
 bool TextToJson(const std::string& text, Json::Value& value) {
-  static const Json::CharReaderBuilder builder = Reader();
-  const std::unique_ptr<Json::CharReader> reader(builder.newCharReader());
+  const Lent<Json::CharReader> reader(
+      spare_reader, +[] { return Reader().newCharReader(); });
   try {
     return reader->parse(text.data(), text.data() + text.size(), &value, nullptr);
   } catch (const Json::Exception& error) {

@@ -36,13 +36,13 @@ class EntryPrivate : public Object {
 
  private:
   friend class Entry;
-  friend bool AdmitAlike(const Entry& one, const Entry& other);
+  friend bool ProtectAlike(const Entry& one, const Entry& other);
 
   // The "data" column: every field from enable_match_ip_ on, as one JSON object. Reading sets all
   // of them, or none and answers false when a member is of the wrong JSON type.
   std::string DataToText() const;
   bool DataFromText(const std::string& text);
-  bool DataFromJson(const Json::Value& data);
+  bool DataFromJson(Json::Value& data);  // takes what it needs out of `data`
 
   std::string project_name_;
   bool enabled_ = true;

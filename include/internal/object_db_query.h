@@ -35,13 +35,18 @@ bool ObjectDB::Query(std::vector<Record>& out) const {
         !result.IsGood()) {
       return false;
     }
-    // Rows that memory does not suffice for are a failure, not rows that are not there.
+    std::vector<Row> rows;
+    for (Row row; result.NextRow(row);) {
+      rows.push_back(row);
+    }
+    // Rows that memory does not suffice for are a failure, not rows that are not there. Room is
+    // made once: a vector that grows copies every record each time.
     std::vector<Record> records;
-    Row row;
-    while (result.NextRow(row)) {
-      Record record;
-      if (record.FromRow(row)) {
-        records.push_back(record);
+    records.reserve(rows.size());
+    for (const Row& row : rows) {
+      records.emplace_back();
+      if (!records.back().FromRow(row)) {
+        records.pop_back();
       }
     }
     out = std::move(records);

@@ -31,6 +31,8 @@ class TUVOSHARING_API Row {
   Field GetField(const std::string& name) const;
 
  private:
+  friend class RowValues;
+
   DBResult_tag* result_;
   unsigned int row_;
 };

@@ -1,5 +1,4 @@
 // TuvoCgiLogin: an account login through PAM.
-#include <security/pam_appl.h>
 #include <syslog.h>
 #include <tuvoplatform/cgi.h>
 
@@ -9,6 +8,7 @@
 #include <cstring>
 #include <string_view>
 
+#include "pam_library.h"
 #include "scoped_identity.h"
 
 namespace {
@@ -99,17 +99,18 @@ extern "C" int TuvoCgiConverse(int count, const struct pam_message** messages,
   return PAM_SUCCESS;
 }
 
-// One PAM transaction; `login` must outlive it.
+// One PAM transaction; both arguments must outlive it.
 class PamLogin {
  public:
-  explicit PamLogin(const LoginInfo& login) : login_(login) {
+  PamLogin(const tuvo_platform::PamLibrary& pam, const LoginInfo& login)
+      : pam_(pam), login_(login) {
     conversation_.conv = TuvoCgiConverse;
     // PAM hands the pointer back to the conversation above, which only reads through it.
     conversation_.appdata_ptr = const_cast<LoginInfo*>(&login_);
   }
   ~PamLogin() {
     if (handle_ != nullptr) {
-      pam_end(handle_, status_);
+      pam_.end(handle_, status_);
     }
   }
   PamLogin(const PamLogin&) = delete;
@@ -118,10 +119,10 @@ class PamLogin {
   // Authentication and account management both. `address` may be null.
   bool Check(const char* address) {
     const bool allowed =
-        Passed(pam_start(login_.szClient, login_.szUser, &conversation_, &handle_)) &&
-        (address == nullptr || Passed(pam_set_item(handle_, PAM_RHOST, address))) &&
-        Passed(pam_authenticate(handle_, PAM_SILENT | PAM_DISALLOW_NULL_AUTHTOK)) &&
-        Passed(pam_acct_mgmt(handle_, PAM_SILENT | PAM_DISALLOW_NULL_AUTHTOK));
+        Passed(pam_.start(login_.szClient, login_.szUser, &conversation_, &handle_)) &&
+        (address == nullptr || Passed(pam_.set_item(handle_, PAM_RHOST, address))) &&
+        Passed(pam_.authenticate(handle_, PAM_SILENT | PAM_DISALLOW_NULL_AUTHTOK)) &&
+        Passed(pam_.acct_mgmt(handle_, PAM_SILENT | PAM_DISALLOW_NULL_AUTHTOK));
     LogTrouble();
     return allowed;
   }
@@ -129,8 +130,8 @@ class PamLogin {
   // The account's name as PAM has it now (modules may change it); null when it has none.
   const char* User() {
     const void* user = nullptr;
-    return pam_get_item(handle_, PAM_USER, &user) == PAM_SUCCESS ? static_cast<const char*>(user)
-                                                                 : nullptr;
+    return pam_.get_item(handle_, PAM_USER, &user) == PAM_SUCCESS ? static_cast<const char*>(user)
+                                                                  : nullptr;
   }
 
  private:
@@ -154,11 +155,12 @@ class PamLogin {
         break;
       default:
         syslog(LOG_ERR, "cgi_login:%d PAM service %s: %s", __LINE__, login_.szClient,
-               pam_strerror(handle_, status_));
+               pam_.strerror(handle_, status_));
         break;
     }
   }
 
+  const tuvo_platform::PamLibrary& pam_;
   const LoginInfo& login_;
   pam_conv conversation_{};
   pam_handle_t* handle_ = nullptr;
@@ -184,7 +186,11 @@ int TuvoCgiLogin(TUVOCGI* cgi, char* reply, unsigned int size, const LoginInfo* 
   const bool has_address = TuvoCgiGetRemoteIP(address.data(), address.size()) == 0;
   // Without root the login is tried all the same: not every PAM module needs it.
   const tuvo_platform::ScopedIdentity root(kRootUid, kRootGid);
-  PamLogin pam(*login);
+  const auto* library = tuvo_platform::PamLibrary::Get(login->szClient);
+  if (library == nullptr) {
+    return kRefused;
+  }
+  PamLogin pam(*library, *login);
   if (!pam.Check(has_address ? address.data() : nullptr)) {
     return kRefused;
   }

@@ -17,10 +17,11 @@ LAYERS = {
     "platform": ("platform/*", []),
     "common": (
         "utils/* include/tuvosharing/{export,keys,utils,user_group,sharing_url,send_webapi}.h "
-        "include/internal/{contained,log,json_text,time_text,user_id,popen}.h",
+        "include/internal/{constant_time,contained,late_library,log,json_text,time_text,user_id,popen}.h",
         ["platform"],
     ),
-    "rows": ("db/{field,row,result}.cpp include/tuvosharing/{field,row,result}.h",
+    "rows": ("db/{field,row,row_values,result}.cpp include/tuvosharing/{field,row,result}.h "
+             "include/internal/row_values.h",
              ["platform", "common"]),
     "connection": (
         "db/{base_db,condition,run_as}.cpp include/tuvosharing/{base_db,condition}.h "

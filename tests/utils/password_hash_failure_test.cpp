@@ -34,24 +34,27 @@ Function Real(const char* name) {
 
 }  // namespace
 
+// The libraries' functions are looked up by name, among what this program exports first.
+#define TUVO_FOUND __attribute__((visibility("default")))
+
 extern "C" {
 
-int MD5_Init(MD5_CTX* context) {
+TUVO_FOUND int MD5_Init(MD5_CTX* context) {
   const int answer = Answer("MD5_Init");
   return answer == 1 ? Real<decltype(&MD5_Init)>("MD5_Init")(context) : answer;
 }
 
-int MD5_Update(MD5_CTX* context, const void* data, size_t length) {
+TUVO_FOUND int MD5_Update(MD5_CTX* context, const void* data, size_t length) {
   const int answer = Answer("MD5_Update");
   return answer == 1 ? Real<decltype(&MD5_Update)>("MD5_Update")(context, data, length) : answer;
 }
 
-int MD5_Final(unsigned char* digest, MD5_CTX* context) {
+TUVO_FOUND int MD5_Final(unsigned char* digest, MD5_CTX* context) {
   const int answer = Answer("MD5_Final");
   return answer == 1 ? Real<decltype(&MD5_Final)>("MD5_Final")(digest, context) : answer;
 }
 
-gcry_error_t gcry_control(enum gcry_ctl_cmds command, ...) {
+TUVO_FOUND gcry_error_t gcry_control(enum gcry_ctl_cmds command, ...) {
   va_list arguments;
   va_start(arguments, command);
   const int argument = va_arg(arguments, int);
@@ -63,13 +66,13 @@ gcry_error_t gcry_control(enum gcry_ctl_cmds command, ...) {
   return Real<decltype(&gcry_control)>("gcry_control")(command, 0);
 }
 
-unsigned int gcry_md_get_algo_dlen(int algo) {
+TUVO_FOUND unsigned int gcry_md_get_algo_dlen(int algo) {
   calls.push_back("length of " + std::string(gcry_md_algo_name(algo)));
   return other_length != 0 ? other_length
                            : Real<decltype(&gcry_md_get_algo_dlen)>("gcry_md_get_algo_dlen")(algo);
 }
 
-void gcry_md_hash_buffer(int algo, void* digest, const void* buffer, size_t length) {
+TUVO_FOUND void gcry_md_hash_buffer(int algo, void* digest, const void* buffer, size_t length) {
   calls.push_back(std::string(gcry_md_algo_name(algo)) + " of " +
                   std::string(static_cast<const char*>(buffer), length));
   Real<decltype(&gcry_md_hash_buffer)>("gcry_md_hash_buffer")(algo, digest, buffer, length);
