@@ -1,0 +1,28 @@
+#include <json/reader.h>
+#include <json/value.h>
+
+#include <memory>
+
+#include "floor/json.h"
+
+namespace {
+
+// As utils/json_text.cpp has it.
+Json::CharReaderBuilder Reader() {
+  Json::CharReaderBuilder builder;
+  builder["collectComments"] = true;
+  builder["allowTrailingCommas"] = false;
+  builder["skipBom"] = false;
+  builder["allowSpecialFloats"] = true;
+  builder["stackLimit"] = 100;
+  return builder;
+}
+
+}  // namespace
+
+int parse_json(const char* text, size_t length) {
+  static const Json::CharReaderBuilder builder = Reader();
+  const std::unique_ptr<Json::CharReader> reader(builder.newCharReader());
+  Json::Value value;
+  return reader->parse(text, text + length, &value, nullptr) ? 0 : -1;
+}
