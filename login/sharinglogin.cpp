@@ -251,7 +251,7 @@ class LinkLogin {
     if (!InForceAlike(now, link)) {
       return kLinkChanged;
     }
-    return IsUsedUp(now) ? kUsedUp : kSuccess;
+    return IsUsedUp(now) ? kLinkChanged : kSuccess;
   }
 
   void NoteUse(bool counted) {
@@ -261,7 +261,8 @@ class LinkLogin {
     }
   }
 
-  // Leaves the use to be counted with the admission when the file could not be had.
+  // Leaves the use to be counted with the admission when the file could not be had, or not be
+  // written.
   int CountUse(const Entry& link) {
     EntryDB entries(db_);  // checkpoints when the transaction is over
     WriteTransaction transaction(db_, joins_);
@@ -274,12 +275,16 @@ class LinkLogin {
       return verdict;
     }
     entry.inc_use_count();
-    NoteUse(entries.Update(entry) && transaction.Commit());
-    return use_ == Use::kUncountable && joins_ ? kFailed : kSuccess;
+    if (!entries.Update(entry)) {
+      NoteUse(false);
+    } else if (transaction.Commit()) {
+      NoteUse(true);
+    }
+    return joins_ && !transaction.IsOpen() ? kFailed : kSuccess;
   }
 
   // Makes session and token, in one transaction: one session must not get two tokens, nor anybody a
-  // token behind the sign-out of all.
+  // token behind a change of the protection, which signs everybody out.
   int Admit(EntryDB& entries, const Entry& link, unsigned int uid, std::string& session_id) {
     SessionDB sessions(db_);
     TokenDB tokens(db_);
@@ -295,9 +300,13 @@ class LinkLogin {
     if (verdict != kSuccess) {
       return verdict;
     }
-    if (use_ == Use::kToCount) {
+    bool counting = use_ == Use::kToCount;
+    if (counting) {
       entry.inc_use_count();
-      NoteUse(entries.Update(entry));
+      counting = entries.Update(entry);
+      if (!counting) {
+        NoteUse(false);
+      }
     }
     Token token;
     std::string text;
@@ -310,7 +319,11 @@ class LinkLogin {
     if (!admitted && transaction.IsOpen()) {
       tokens.Delete(token);
     }
-    if (!transaction.Commit() || !admitted) {
+    const bool written = transaction.Commit();
+    if (counting) {
+      NoteUse(written);
+    }
+    if (!written || !admitted) {
       return kFailed;
     }
     session_id = std::move(text);

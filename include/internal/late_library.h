@@ -18,8 +18,8 @@ class LateLibrary {
   // it. Throws std::runtime_error with the loader's reason when it cannot.
   explicit LateLibrary(const char* soname);
 
-  // The function as a program linked with the library would get it: a definition that comes earlier
-  // in the process goes before the library's. Throws std::runtime_error when there is none.
+  // The function by its name, whatever its version: a definition that comes earlier in the process
+  // goes before the library's. Throws std::runtime_error when there is none.
   template <typename Function>
   Function* Find(const char* name) const {
     return reinterpret_cast<Function*>(Address(name));

@@ -35,6 +35,13 @@ class LinkLogin : public VisitTest {
   std::string Sessions() { return Value("SELECT COUNT(*) FROM session"); }
   std::string Tokens() { return Value("SELECT COUNT(*) FROM token"); }
 
+  void ExpectNotCounted(int code, const Reply& reply) {
+    EXPECT_EQ(code, reply.code);
+    EXPECT_EQ(kUntouched, reply.session_id);
+    EXPECT_EQ("3", UseCount());
+    EXPECT_EQ("0", Tokens());
+  }
+
   // Waits for a process that is to end well.
   static void Join(pid_t process) {
     int status = -1;
@@ -354,6 +361,17 @@ TEST_F(LinkLogin, TheLimitIsTheOneOfTheMomentOfCounting) {
   EXPECT_EQ(1, Login(Visit(hash)).code);
   Join(owner);
   EXPECT_EQ((std::vector<TextRow>{{"4", "4"}}), Rows("SELECT use_count, expire_times FROM entry"));
+}
+
+TEST_F(LinkLogin, ALinkThatIsUsedMoreThanItsNewLimitIsNotEvenValidWhenTheUseIsCounted) {
+  const std::string hash = MakeLimitedLink(4, 3);
+  const pid_t owner = StartWriter("UPDATE entry SET expire_times = 2");
+  const Reply reply = Login(Visit(hash));
+  Join(owner);
+  ExpectNotCounted(-3, reply);
+  EXPECT_EQ(Lines{"entry:LINE (PID) Failed [0 < expire_times_ && use_count_ > expire_times_], "
+                  "err=ERRNO\n\n"},
+            reply.log);
 }
 
 // The owner's change is written while the login has the link's former protection behind it.
