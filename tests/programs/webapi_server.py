@@ -129,7 +129,7 @@ class HttpFront:
                    if value is not None}
         if who is not None:
             headers.setdefault("Authorization", basic(who))
-        connection = http.client.HTTPConnection("127.0.0.1", self.server.port, timeout=60)
+        connection = http.client.HTTPConnection("127.0.0.1", self.server.port, timeout=180)
         try:
             connection.request(method, path, body, headers)
             response = connection.getresponse()
