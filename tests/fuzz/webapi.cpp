@@ -98,10 +98,19 @@ struct State {
   std::string entries;
   std::string sessions;
   std::string tokens;
+  std::string passwords;
 };
 
+// A line for each link that asks for a password.
+std::string DumpPasswords() {
+  return fuzz::Column(
+      "SELECT id || '|' || quote(json_extract(data, '$.protect_password')) || '|' || "
+      "quote(json_extract(data, '$.protect_password_salt')) AS c FROM entry WHERE "
+      "json_valid(data) AND json_extract(data, '$.protect_type') = 'password' ORDER BY id");
+}
+
 State StateNow() {
-  return {fuzz::DumpEntries(), fuzz::DumpSessions(), fuzz::DumpTokens()};
+  return {fuzz::DumpEntries(), fuzz::DumpSessions(), fuzz::DumpTokens(), DumpPasswords()};
 }
 
 // The state at first; set up only where an input before has changed something.
@@ -309,10 +318,30 @@ class Exchange {
     CheckMethod(answer["data"], gone, come);
   }
 
-  // The second of a dumped row's cells.
+  // A dumped row's first cell, and its second.
+  static std::string Id(const std::string& row) { return row.substr(0, row.find('|')); }
   static std::string Owner(const std::string& row) {
     const std::size_t begin = row.find('|') + 1;
     return row.substr(begin, row.find('|', begin) - begin);
+  }
+
+  // A link that asks for a password which nobody inside has given keeps none of its visitors; all
+  // other visitors stay.
+  void CheckVisitors(const std::vector<std::string>& changed) {
+    const std::set<std::string> before = LinesOf(before_.passwords);
+    std::string signed_out;
+    for (const std::string& line : LinesOf(after_.passwords)) {
+      if (before.count(line) == 0) {
+        Require(changed.size() == 1 && Id(line) == Id(changed[0]), "one password is changed");
+        signed_out = Id(line);
+      }
+    }
+    std::string staying;
+    for (const std::string& row : LinesOf(before_.tokens)) {
+      // The token's link is where a link's owner is.
+      staying += !signed_out.empty() && Owner(row) == signed_out ? "" : row + "\n";
+    }
+    RequireEqual(after_.tokens, staying, "a change leaves the visitors, but of a new password");
   }
 
   void CheckMethod(const Json::Value& data, const std::vector<std::string>& gone,
@@ -322,7 +351,7 @@ class Exchange {
       Require(gone.empty() && come.size() == 1, "a creation adds one row");
     } else if (method == "set") {
       Require(gone.size() == come.size() && gone.size() <= 1, "a change changes one row");
-      RequireEqual(after_.tokens, before_.tokens, "a change leaves the visitors");
+      CheckVisitors(come);
     } else if (method == "delete") {
       Require(gone.size() == 1 && come.empty() && data["deleted"] == 1, "one link is deleted");
     } else if (method == "delete_expired") {
