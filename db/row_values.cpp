@@ -42,24 +42,24 @@ T ReadNumber(const char* text, T def, T (Field::*convert)(T)) {
 
 }  // namespace
 
-const char* RowValues::Find(const char* column) const {
+const char* RowValues::Bytes(const char* column) const {
   return row_.IsGood() ? TUVODBFetchField(row_.result_, row_.row_, column) : "";
 }
 
 std::string RowValues::Text(const char* column) const {
-  return Find(column);
+  return Bytes(column);
 }
 
 int RowValues::Int(const char* column, int def) const {
-  return ReadNumber(Find(column), def, &Field::AsInt);
+  return ReadNumber(Bytes(column), def, &Field::AsInt);
 }
 
 unsigned int RowValues::UInt(const char* column, unsigned int def) const {
-  return ReadNumber(Find(column), def, &Field::AsUInt);
+  return ReadNumber(Bytes(column), def, &Field::AsUInt);
 }
 
 long RowValues::Time(const char* column, long def) const {
-  return ReadNumber(Find(column), def, &Field::AsTime);
+  return ReadNumber(Bytes(column), def, &Field::AsTime);
 }
 
 }  // namespace TUVO::sharing::db

@@ -20,9 +20,7 @@ int SetEffectiveGid(gid_t gid) {
 }
 
 // Root is regained first: only root may take any group, and any user but its own.
-bool Take(uid_t uid, gid_t gid) {
-  const uid_t current_uid = geteuid();
-  const gid_t current_gid = getegid();
+bool Take(uid_t current_uid, gid_t current_gid, uid_t uid, gid_t gid) {
   if (current_uid == uid && current_gid == gid) {
     return true;
   }
@@ -41,7 +39,7 @@ __::__(std::string_view source, int line, const char* name)
     : saved_uid_(geteuid()), saved_gid_(getegid()), source_(source), line_(line), name_(name) {}
 
 bool __::SwitchTo(uid_t uid, gid_t gid) const {
-  if (Take(uid, gid)) {
+  if (Take(saved_uid_, saved_gid_, uid, gid)) {
     return true;
   }
   const int error = errno;

@@ -236,23 +236,31 @@ void EntryPrivate::ToJSON(Json::Value& value) const {
 
 bool EntryPrivate::FromRow(const db::Row& row) {
   const db::RowValues values(row);
-  // So that a row that memory does not suffice for changes nothing: half of it would be a link
-  // without its protection.
-  EntryPrivate read(*this);
-  read.id_ = values.Int(SZK_ID_, 0);
-  read.key_ = values.Text(SZK_HASH);
-  read.project_name_ = values.Text(SZK_PROJECT_NAME);
+  // Read beside what is there, so that a row that memory does not suffice for changes nothing: half
+  // of it would be a link without its protection.
+  const int id = values.Int(SZK_ID_, 0);
+  std::string hash = values.Text(SZK_HASH);
+  std::string project_name = values.Text(SZK_PROJECT_NAME);
   const std::string enabled = values.Text(SZK_ENABLED_);
+  const unsigned int owner_uid = values.UInt(SZK_OWNER_UID, UID_ERR);
+  const std::time_t start_at = values.Time(SZK_START_AT, 0);
+  const std::time_t expire_at = values.Time(SZK_EXPIRE_AT, 0);
+  const int expire_times = values.Int(SZK_EXPIRE_TIMES, 0);
+  const int use_count = values.Int(SZK_USE_COUNT, 0);
+  const bool auto_gc = values.Int(SZK_AUTO_GC, 0) != 0;
+  const bool has_data = DataFromText(values.Bytes(SZK_DATA));
+  // Nothing below needs memory.
+  id_ = id;
+  key_ = std::move(hash);
+  project_name_ = std::move(project_name);
   // A row without the value is a link that nobody switched off.
-  read.enabled_ = enabled.empty() || enabled == "1";
-  read.owner_uid_ = values.UInt(SZK_OWNER_UID, UID_ERR);
-  read.start_at_ = values.Time(SZK_START_AT, 0);
-  read.expire_at_ = values.Time(SZK_EXPIRE_AT, 0);
-  read.expire_times_ = values.Int(SZK_EXPIRE_TIMES, 0);
-  read.use_count_ = values.Int(SZK_USE_COUNT, 0);
-  read.auto_gc_ = values.Int(SZK_AUTO_GC, 0) != 0;
-  const bool has_data = read.DataFromText(values.Text(SZK_DATA));
-  *this = std::move(read);
+  enabled_ = enabled.empty() || enabled == "1";
+  owner_uid_ = owner_uid;
+  start_at_ = start_at;
+  expire_at_ = expire_at;
+  expire_times_ = expire_times;
+  use_count_ = use_count;
+  auto_gc_ = auto_gc;
   return has_data && IsLegal();
 }
 

@@ -3,6 +3,8 @@
 #include <internal/json_text.h>
 #include <tuvosharing/keys.h>
 
+#include <array>
+#include <string_view>
 #include <utility>
 
 namespace TUVO::sharing::record {
@@ -88,44 +90,9 @@ bool Read(const Json::Value& value, std::vector<T>& out) {
   return true;
 }
 
-template <typename T>
-Json::Value ToArray(const std::vector<T>& items) {
-  Json::Value array(Json::arrayValue);
-  for (const T& item : items) {
-    array.append(item);
-  }
-  return array;
-}
-
-}  // namespace
-
-std::string EntryPrivate::DataToText() const {
-  Json::Value data(Json::objectValue);
-  data[SZK_ENABLE_MATCH_IP] = enable_match_ip_;
-  data[SZK_PROTECT_TYPE] = StoredText(protect_type_);
-  data[SZK_PROTECT_TITLE] = protect_title_;
-  data[SZK_PROTECT_PASSWORD] = protect_password_;
-  data[SZK_PROTECT_PASSWORD_ALGO] = StoredText(protect_password_algo_);
-  data[SZK_PROTECT_PASSWORD_SALT] = protect_password_salt_;
-  data[SZK_PROTECT_UIDS] = ToArray(protect_uids_);
-  data[SZK_PROTECT_EXTRA_USERS] = ToArray(protect_extra_users_);
-  data[SZK_PROTECT_GIDS] = ToArray(protect_gids_);
-  data[SZK_PROTECT_EXTRA_GROUPS] = ToArray(protect_extra_groups_);
-  data[SZK_REDIRECT_TYPE] = StoredText(redirect_type_);
-  data[SZK_REDIRECT_URI] = redirect_uri_;
-  data[SZK_APP] = app_;
-  data[SZK_PRIVATE_DATA] = private_data_;
-  return JsonToText(data);
-}
-
-bool EntryPrivate::DataFromText(const std::string& text) {
-  Json::Value data;
-  return TextToJson(text, data) && data.isObject() && DataFromJson(data);
-}
-
-bool EntryPrivate::DataFromJson(Json::Value& data) {
-  // Read beside what is there, so that a document that cannot be read changes nothing.
-  const Json::Value& members = data;  // a look at what is missing must not make it
+// What a document says, beside the fields that it will replace: one that cannot be read changes
+// nothing. What it does not say is as it is here.
+struct Document {
   bool enable_match_ip = false;
   std::string protect_type;
   std::string protect_title;
@@ -138,41 +105,110 @@ bool EntryPrivate::DataFromJson(Json::Value& data) {
   std::vector<std::string> protect_extra_groups;
   std::string redirect_type;
   std::string redirect_uri;
-  if (!Read(members[SZK_ENABLE_MATCH_IP], enable_match_ip) ||
-      !Read(members[SZK_PROTECT_TYPE], protect_type) ||
-      !Read(members[SZK_PROTECT_TITLE], protect_title) ||
-      !Read(members[SZK_PROTECT_PASSWORD], protect_password) ||
-      !Read(members[SZK_PROTECT_PASSWORD_ALGO], protect_password_algo) ||
-      !Read(members[SZK_PROTECT_PASSWORD_SALT], protect_password_salt) ||
-      !Read(members[SZK_PROTECT_UIDS], protect_uids) ||
-      !Read(members[SZK_PROTECT_EXTRA_USERS], protect_extra_users) ||
-      !Read(members[SZK_PROTECT_GIDS], protect_gids) ||
-      !Read(members[SZK_PROTECT_EXTRA_GROUPS], protect_extra_groups) ||
-      !Read(members[SZK_REDIRECT_TYPE], redirect_type) ||
-      !Read(members[SZK_REDIRECT_URI], redirect_uri)) {
+  Json::Value app;
+  Json::Value private_data = Json::Value(Json::objectValue);
+};
+
+template <auto Field>
+bool ReadInto(Json::Value& value, Document& document) {
+  return Read(value, document.*Field);
+}
+
+template <auto Field>
+bool TakeInto(Json::Value& value, Document& document) {
+  (document.*Field).swap(value);
+  return true;
+}
+
+struct Member {
+  std::string_view name;
+  bool (*read)(Json::Value& value, Document& document);
+};
+
+// One walk over what is there: looking for each name by itself takes as long as parsing a short
+// document. Takes `app` and the private data out of `data`.
+bool ReadMembers(Json::Value& data, Document& document) {
+  const std::array<Member, 14> members = {{
+      {SZK_APP, TakeInto<&Document::app>},
+      {SZK_ENABLE_MATCH_IP, ReadInto<&Document::enable_match_ip>},
+      {SZK_PRIVATE_DATA, TakeInto<&Document::private_data>},
+      {SZK_PROTECT_EXTRA_GROUPS, ReadInto<&Document::protect_extra_groups>},
+      {SZK_PROTECT_EXTRA_USERS, ReadInto<&Document::protect_extra_users>},
+      {SZK_PROTECT_GIDS, ReadInto<&Document::protect_gids>},
+      {SZK_PROTECT_PASSWORD, ReadInto<&Document::protect_password>},
+      {SZK_PROTECT_PASSWORD_ALGO, ReadInto<&Document::protect_password_algo>},
+      {SZK_PROTECT_PASSWORD_SALT, ReadInto<&Document::protect_password_salt>},
+      {SZK_PROTECT_TITLE, ReadInto<&Document::protect_title>},
+      {SZK_PROTECT_TYPE, ReadInto<&Document::protect_type>},
+      {SZK_PROTECT_UIDS, ReadInto<&Document::protect_uids>},
+      {SZK_REDIRECT_TYPE, ReadInto<&Document::redirect_type>},
+      {SZK_REDIRECT_URI, ReadInto<&Document::redirect_uri>},
+  }};
+  for (auto value = data.begin(); value != data.end(); ++value) {
+    const char* end = nullptr;
+    const char* const begin = value.memberName(&end);
+    const std::string_view name(begin, static_cast<std::size_t>(end - begin));
+    for (const Member& member : members) {
+      if (member.name == name && !member.read(*value, document)) {
+        return false;
+      }
+    }
+  }
+  return true;
+}
+
+template <typename T>
+Json::Value ToArray(const std::vector<T>& items) {
+  Json::Value array(Json::arrayValue);
+  for (const T& item : items) {
+    array.append(item);
+  }
+  return array;
+}
+
+}  // namespace
+
+std::string EntryPrivate::DataToText() const {
+  using Name = Json::StaticString;  // such are not copied
+  Json::Value data(Json::objectValue);
+  data[Name(SZK_ENABLE_MATCH_IP)] = enable_match_ip_;
+  data[Name(SZK_PROTECT_TYPE)] = Name(StoredText(protect_type_));
+  data[Name(SZK_PROTECT_TITLE)] = protect_title_;
+  data[Name(SZK_PROTECT_PASSWORD)] = protect_password_;
+  data[Name(SZK_PROTECT_PASSWORD_ALGO)] = Name(StoredText(protect_password_algo_));
+  data[Name(SZK_PROTECT_PASSWORD_SALT)] = protect_password_salt_;
+  data[Name(SZK_PROTECT_UIDS)] = ToArray(protect_uids_);
+  data[Name(SZK_PROTECT_EXTRA_USERS)] = ToArray(protect_extra_users_);
+  data[Name(SZK_PROTECT_GIDS)] = ToArray(protect_gids_);
+  data[Name(SZK_PROTECT_EXTRA_GROUPS)] = ToArray(protect_extra_groups_);
+  data[Name(SZK_REDIRECT_TYPE)] = Name(StoredText(redirect_type_));
+  data[Name(SZK_REDIRECT_URI)] = redirect_uri_;
+  data[Name(SZK_APP)] = app_;
+  data[Name(SZK_PRIVATE_DATA)] = private_data_;
+  return JsonToText(data);
+}
+
+bool EntryPrivate::DataFromText(const char* text) {
+  Json::Value data;
+  Document document;
+  if (!TextToJson(text, data) || !data.isObject() || !ReadMembers(data, document)) {
     return false;
   }
-  Json::Value private_data(Json::objectValue);
-  if (data.isMember(SZK_PRIVATE_DATA)) {
-    private_data.swap(data[SZK_PRIVATE_DATA]);
-  }
-  Json::Value app;
-  app.swap(data[SZK_APP]);
   // Nothing below needs memory.
-  enable_match_ip_ = enable_match_ip;
-  protect_type_ = ToProtectType(protect_type);
-  protect_title_ = std::move(protect_title);
-  protect_password_ = std::move(protect_password);
-  protect_password_algo_ = ToPasswordEncryptAlgo(protect_password_algo);
-  protect_password_salt_ = std::move(protect_password_salt);
-  protect_uids_ = std::move(protect_uids);
-  protect_extra_users_ = std::move(protect_extra_users);
-  protect_gids_ = std::move(protect_gids);
-  protect_extra_groups_ = std::move(protect_extra_groups);
-  redirect_type_ = ToRedirectType(redirect_type);
-  redirect_uri_ = std::move(redirect_uri);
-  app_.swap(app);
-  private_data_.swap(private_data);
+  enable_match_ip_ = document.enable_match_ip;
+  protect_type_ = ToProtectType(document.protect_type);
+  protect_title_ = std::move(document.protect_title);
+  protect_password_ = std::move(document.protect_password);
+  protect_password_algo_ = ToPasswordEncryptAlgo(document.protect_password_algo);
+  protect_password_salt_ = std::move(document.protect_password_salt);
+  protect_uids_ = std::move(document.protect_uids);
+  protect_extra_users_ = std::move(document.protect_extra_users);
+  protect_gids_ = std::move(document.protect_gids);
+  protect_extra_groups_ = std::move(document.protect_extra_groups);
+  redirect_type_ = ToRedirectType(document.redirect_type);
+  redirect_uri_ = std::move(document.redirect_uri);
+  app_.swap(document.app);
+  private_data_.swap(document.private_data);
   return true;
 }
 

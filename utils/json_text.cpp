@@ -72,7 +72,7 @@ std::string JsonToText(const Json::Value& value) {
   return text.str();
 }
 
-bool TextToJson(const std::string& text, Json::Value& value) {
+bool TextToJson(std::string_view text, Json::Value& value) {
   const Lent<Json::CharReader> reader(
       spare_reader, +[] { return Reader().newCharReader(); });
   try {

@@ -41,8 +41,7 @@ class EntryPrivate : public Object {
   // The "data" column: every field from enable_match_ip_ on, as one JSON object. Reading sets all
   // of them, or none and answers false when a member is of the wrong JSON type.
   std::string DataToText() const;
-  bool DataFromText(const std::string& text);
-  bool DataFromJson(Json::Value& data);  // takes what it needs out of `data`
+  bool DataFromText(const char* text);
 
   std::string project_name_;
   bool enabled_ = true;

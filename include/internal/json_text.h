@@ -5,6 +5,7 @@
 #include <json/value.h>
 
 #include <string>
+#include <string_view>
 
 namespace TUVO::sharing {
 
@@ -18,7 +19,7 @@ std::string JsonToText(const Json::Value& value);
 
 // False, `value` unspecified, when the text is no JSON document or is nested too deeply. Never
 // throws for any text.
-bool TextToJson(const std::string& text, Json::Value& value);
+bool TextToJson(std::string_view text, Json::Value& value);
 
 // jsoncpp throws the same exception for a document that is nested too deeply and for want of
 // memory, and only its text tells them apart. Throws std::bad_alloc in the second case: a document

@@ -18,15 +18,15 @@ class RowValues {
   // Empty for NULL, for an unknown column and when the row is not good.
   std::string Text(const char* column) const;
 
+  // The same without a copy; valid as long as the row's result.
+  const char* Bytes(const char* column) const;
+
   // `def` when there is no number or it does not fit.
   int Int(const char* column, int def) const;
   unsigned int UInt(const char* column, unsigned int def) const;
   long Time(const char* column, long def) const;
 
  private:
-  // Valid as long as the row's result.
-  const char* Find(const char* column) const;
-
   const Row& row_;
 };
 

@@ -34,7 +34,8 @@ class __ {
   // left as it was.
   ~__();
 
-  // Takes the effective ids `uid` and `gid`; nothing is called when they are in force already.
+  // Takes the effective ids `uid` and `gid`; nothing is called when they are in force already. To
+  // be called while the remembered ids are those in force: they are not asked for again.
   // A failure is logged (authorisation facility, error), and may leave root or one of the two ids
   // in force until the destructor.
   bool SwitchTo(uid_t uid, gid_t gid) const;

@@ -22,6 +22,7 @@ class ConditionPrivate;
 // Bound to the connection that it escapes with, which must outlive it. Not copyable.
 class TUVOSHARING_API Condition {
  public:
+  // Without a clause, sort key or range: every row, in any order.
   explicit Condition(BaseDB& db);
   Condition(const Condition&) = delete;
   Condition& operator=(const Condition&) = delete;

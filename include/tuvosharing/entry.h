@@ -25,24 +25,36 @@ class Object;
 // visitors must prove themselves. Times are seconds since the epoch; 0 means "not set".
 class TUVOSHARING_API Entry {
  public:
-  // The three kinds below may hold any int: numbers that callers pass on unchecked have a meaning
-  // too.
-
-  // How visitors are admitted.
-  enum ProtectType : int { PROTECT_NONE = 0, PROTECT_PASSWORD = 1, PROTECT_USER = 2 };
-  // How the link's password is kept: salted SHA-1, or plain MD5.
-  enum PasswordEncryptAlgo : int { ENCRYPT_ALGO_DEFAULT = 0, ENCRYPT_ALGO_MD5 = 1 };
-  // When the visitor is sent on to redirect_uri.
-  enum RedirectType : int { REDIRECT_NONE = 0, REDIRECT_URLPARAM = 1, REDIRECT_ALWAYS = 2 };
+  // How visitors are admitted. Like the two kinds below it may hold any int: numbers that callers
+  // pass on unchecked have a meaning too.
+  enum ProtectType : int {
+    PROTECT_NONE = 0,      // everybody who has the address
+    PROTECT_PASSWORD = 1,  // whoever has the link's password
+    PROTECT_USER = 2       // the listed accounts and the members of the listed groups
+  };
+  // How the link's password is kept.
+  enum PasswordEncryptAlgo : int {
+    ENCRYPT_ALGO_DEFAULT = 0,  // SHA-1 of password and salt
+    ENCRYPT_ALGO_MD5 = 1       // MD5 of the password, as older programs kept it
+  };
+  // When an admitted visitor is sent on to redirect_uri; whoever serves the link does it.
+  enum RedirectType : int {
+    REDIRECT_NONE = 0,      // never
+    REDIRECT_URLPARAM = 1,  // when the request asks for it
+    REDIRECT_ALWAYS = 2     // always
+  };
 
   // Enabled, unprotected, collected once expired, bound to the visitor's address; not legal until
   // it has a hash, a project, an owner and an object as `app`.
   Entry();
+  // A copy is a link of its own, with the same id.
   Entry(const Entry& other);
   // The source stays usable, its texts and lists empty and its numbers unchanged. Allocates, hence
   // may throw bad_alloc.
   Entry(Entry&& other);  // NOLINT(performance-noexcept-move-constructor)
+  // The object that GetObject has given out stays the same one.
   Entry& operator=(const Entry& other);
+  // The same; the source is left as by the move constructor.
   Entry& operator=(Entry&& other) noexcept;
   virtual ~Entry();
 
@@ -89,6 +101,7 @@ class TUVOSHARING_API Entry {
   std::string get_project_name() const;
   Entry& set_project_name(const std::string& project_name);
 
+  // Whether the owner lets visitors use the link.
   bool get_enabled() const;
   Entry& set_enabled(const bool& enabled);
 
@@ -115,8 +128,10 @@ class TUVOSHARING_API Entry {
   int get_expire_times() const;
   Entry& set_expire_times(const int& expire_times);
 
+  // The number of uses so far: each login counts one, and so does TuvoSharingIncreaseUseCount.
   int get_use_count() const;
   Entry& set_use_count(const int& use_count);
+  // One more; stops at the largest int.
   void inc_use_count();
 
   // Whether the link may be purged automatically once expired.
@@ -127,6 +142,7 @@ class TUVOSHARING_API Entry {
   bool get_enable_match_ip() const;
   Entry& set_enable_match_ip(bool enable_match_ip);
 
+  // How visitors are admitted.
   ProtectType get_protect_type() const;
   Entry& set_protect_type(ProtectType protect_type);
 
@@ -156,6 +172,7 @@ class TUVOSHARING_API Entry {
   Entry& set_protect_groups(const std::vector<std::string>& names);
   Entry& set_protect_gids(const std::vector<unsigned int>& gids);
 
+  // When an admitted visitor is sent on, and where to: any text, which nothing here checks.
   RedirectType get_redirect_type() const;
   Entry& set_redirect_type(RedirectType redirect_type);
   std::string get_redirect_uri() const;

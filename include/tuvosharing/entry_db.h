@@ -27,14 +27,16 @@ class TUVOSHARING_API EntryDB {
   EntryDB& operator=(const EntryDB&) = delete;
   virtual ~EntryDB();
 
-  // Not legal: refused and logged. On success `entry` has its new id.
+  // Inserts a row. A record that is not legal is refused, which is logged. On success `entry` has
+  // its new id.
   bool Create(record::Entry& entry);
   // Writes every column of the row with the record's id; true also when there is no such row.
   bool Update(const record::Entry& entry);
-  // True also when there is no such row.
+  // Deletes a row, told by its id or by the record's; true also when there is no such row.
   bool Delete(int id);
   bool Delete(const record::Entry& entry);
-  // False when there is no such row (`entry` untouched), and when it loads as not legal (filled).
+  // Loads a row. False when there is none (`entry` untouched), and when it loads as not legal
+  // (filled).
   bool GetById(int id, record::Entry& entry) const;
 
   // The filter of the next Count or Query, which clear it.
@@ -56,7 +58,7 @@ class TUVOSHARING_API EntryDB {
   // The link that the token admits to; as GetById.
   bool GetByToken(const record::Token& token, record::Entry& entry) const;
 
-  // Deletes every link of one owner.
+  // Deletes every link of one owner; true also when there is none.
   bool DeleteByOwnerUid(unsigned int uid);
 
   // With the given probability (whole per cent) deletes every link that may be collected

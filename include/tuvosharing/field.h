@@ -9,8 +9,10 @@
 
 namespace TUVO::sharing::db {
 
+// One value, without its NULL: that one reads as the empty text.
 class TUVOSHARING_API Field {
  public:
+  // Holds a copy of the text.
   explicit Field(const std::string& value);
   // A copy has the text alone; its conversions start afresh.
   Field(const Field& other);

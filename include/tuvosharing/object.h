@@ -41,15 +41,17 @@ class TUVOSHARING_API Object {
   void set_id(int id) { id_ = id; }
 
  protected:
+  // Usable, not stored, without a key.
   Object();
+  // Copies and moves take all three members; a moved-from object keeps its numbers.
   Object(const Object&);
   Object(Object&&) noexcept;
   Object& operator=(const Object&);
   Object& operator=(Object&&) noexcept;
 
   bool blValid_ = true;  // false while the record is known to be unusable
-  int id_ = 0;
-  std::string key_;  // the record's unique random text, if its kind has one
+  int id_ = 0;           // the row's id
+  std::string key_;      // the record's unique random text, if its kind has one
 };
 
 }  // namespace record

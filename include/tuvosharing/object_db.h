@@ -63,8 +63,11 @@ class TUVOSHARING_API ObjectDB {
   std::unique_ptr<Condition> condition_;
 
  protected:
+  // The database that the store works on.
   BaseDB& GetDB() const { return *db_; }
+  // The table's name.
   const char* GetTable() const { return table_; }
+  // 1 in every store.
   int GetFlag() const { return flag_; }
 };
 

@@ -11,12 +11,14 @@ struct DBResult_tag;
 
 namespace TUVO::sharing::db {
 
+// What Result::NextRow fills: cheap to make, to copy and to point elsewhere.
 class TUVOSHARING_API Row {
  public:
   // No row: every field reads as the empty text.
   Row();
   // Row number `row` of `result`, which is borrowed and never freed here.
   Row(DBResult_tag* result, unsigned int row);
+  // A copy is a view of the same row.
   Row(const Row&) = default;
   Row& operator=(const Row&) = default;
   virtual ~Row();
@@ -24,6 +26,7 @@ class TUVOSHARING_API Row {
   // True when there is a result behind the row.
   bool IsGood() const;
 
+  // Point the view at another result (borrowed, null for none) or at another row of the same.
   void SetResult(DBResult_tag* result);
   void SetRow(unsigned int row);
 

@@ -21,15 +21,20 @@ namespace record {
 class Object;
 class SessionPrivate;
 
+// Who a visitor is from one request to the next, whatever the links. Times are seconds since the
+// epoch.
 class TUVOSHARING_API Session {
  public:
   // Not legal until its identifier, address and a timeout in the future are set; without a user.
   Session();
+  // A copy is a session of its own, with the same id.
   Session(const Session& other);
   // The source stays usable, its texts empty and its numbers unchanged. Allocates, hence may throw
   // bad_alloc.
   Session(Session&& other);  // NOLINT(performance-noexcept-move-constructor)
+  // The object that GetObject has given out stays the same one.
   Session& operator=(const Session& other);
+  // The same; the source is left as by the move constructor.
   Session& operator=(Session&& other) noexcept;
   virtual ~Session();
 

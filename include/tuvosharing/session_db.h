@@ -26,14 +26,16 @@ class TUVOSHARING_API SessionDB {
   SessionDB& operator=(const SessionDB&) = delete;
   virtual ~SessionDB();
 
-  // Not legal: refused and logged. On success `session` has its new id.
+  // Inserts a row. A record that is not legal is refused, which is logged. On success `session` has
+  // its new id.
   bool Create(record::Session& session);
   // Writes every column of the row with the record's id; true also when there is no such row.
   bool Update(const record::Session& session);
-  // True also when there is no such row.
+  // Deletes a row, told by its id or by the record's; true also when there is no such row.
   bool Delete(int id);
   bool Delete(const record::Session& session);
-  // False when there is no such row (`session` untouched), and when it loads as not legal (filled).
+  // Loads a row. False when there is none (`session` untouched), and when it loads as not legal
+  // (filled).
   bool GetById(int id, record::Session& session) const;
 
   // The filter of the next Count or Query, which clear it.

@@ -21,14 +21,19 @@ namespace record {
 class Object;
 class TokenPrivate;
 
+// A row that binds a session to a link; without one a visitor has to log in. Times are seconds
+// since the epoch.
 class TUVOSHARING_API Token {
  public:
   // Not legal until its ids and a timeout in the future are set.
   Token();
+  // A copy is a token of its own, with the same id.
   Token(const Token& other);
   // The source stays usable, with its numbers unchanged. Allocates, hence may throw bad_alloc.
   Token(Token&& other);  // NOLINT(performance-noexcept-move-constructor)
+  // The object that GetObject has given out stays the same one.
   Token& operator=(const Token& other);
+  // The same; the source is left as by the move constructor.
   Token& operator=(Token&& other) noexcept;
   virtual ~Token();
 

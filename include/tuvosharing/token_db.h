@@ -28,14 +28,16 @@ class TUVOSHARING_API TokenDB {
   TokenDB& operator=(const TokenDB&) = delete;
   virtual ~TokenDB();
 
-  // Not legal: refused and logged. On success `token` has its new id.
+  // Inserts a row. A record that is not legal is refused, which is logged. On success `token` has
+  // its new id.
   bool Create(record::Token& token);
   // Writes every column of the row with the record's id; true also when there is no such row.
   bool Update(const record::Token& token);
-  // True also when there is no such row.
+  // Deletes a row, told by its id or by the record's; true also when there is no such row.
   bool Delete(int id);
   bool Delete(const record::Token& token);
-  // False when there is no such row (`token` untouched), and when it loads as not legal (filled).
+  // Loads a row. False when there is none (`token` untouched), and when it loads as not legal
+  // (filled).
   bool GetById(int id, record::Token& token) const;
 
   // The filter of the next Count or Query, which clear it.

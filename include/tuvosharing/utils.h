@@ -36,6 +36,7 @@ TUVOSHARING_API bool IsProbabilityHit(float probability);
 template <typename T>
 std::string ToString(T& value);
 
+// The five types.
 template <>
 TUVOSHARING_API std::string ToString<std::string>(std::string& value);
 template <>

@@ -2,6 +2,7 @@
 
 #include <sqlite3.h>
 
+#include <algorithm>
 #include <cstring>
 #include <limits>
 #include <new>
@@ -11,6 +12,11 @@ namespace {
 
 // Where the empty text lies, for the many cells that are NULL or empty.
 constexpr std::size_t kEmpty = 0;
+
+// Bytes of text: what a row of any table needs with its columns' names, and what is worth copying
+// once to give memory back.
+constexpr std::size_t kShortResult = 512;
+constexpr std::size_t kLongResult = std::size_t{1024} * 1024;
 
 // The text of one column of the current row, never null. SQLite ends it with a zero whatever the
 // column's type is.
@@ -29,13 +35,16 @@ const char* ColumnText(sqlite3_stmt* statement, int column) {
 }  // namespace
 
 DBResult_tag::DBResult_tag(sqlite3_stmt* statement)
-    : columns_(sqlite3_column_count(statement)), text_(1, '\0') {
-  for (int column = 0; column < columns_; ++column) {
+    : columns_(static_cast<std::size_t>(sqlite3_column_count(statement))), text_(1, '\0') {
+  text_.reserve(kShortResult);
+  cells_.reserve(2 * columns_);
+  for (int column = 0; static_cast<std::size_t>(column) < columns_; ++column) {
     const char* name = sqlite3_column_name(statement, column);
     if (name == nullptr) {
       throw std::bad_alloc();
     }
-    column_of_.emplace(name, column);
+    names_differ_ = names_differ_ && ColumnOf(name) == columns_;
+    AddText(name);
   }
 }
 
@@ -43,15 +52,17 @@ void DBResult_tag::AddRow(sqlite3_stmt* statement) {
   if (rows_ == std::numeric_limits<unsigned int>::max()) {
     throw std::length_error("too many rows");
   }
-  for (int column = 0; column < columns_; ++column) {
-    const char* text = ColumnText(statement, column);
-    const std::size_t length = std::strlen(text);  // a zero within the value ends it
-    cells_.push_back(length == 0 ? kEmpty : text_.size());
-    if (length != 0) {
-      text_.append(text, length + 1);
-    }
+  for (int column = 0; static_cast<std::size_t>(column) < columns_; ++column) {
+    AddText(ColumnText(statement, column));
   }
   ++rows_;
+}
+
+void DBResult_tag::Finish() {
+  if (text_.size() > kLongResult) {
+    text_.shrink_to_fit();
+    cells_.shrink_to_fit();
+  }
 }
 
 bool DBResult_tag::NextRow(unsigned int* row) {
@@ -62,13 +73,34 @@ bool DBResult_tag::NextRow(unsigned int* row) {
   return true;
 }
 
-const char* DBResult_tag::Field(unsigned int row, const char* name) const {
-  const auto column = column_of_.find(name);
-  if (column == column_of_.end() || row >= rows_) {
-    return "";
+const char* DBResult_tag::Field(unsigned int row, const char* name) {
+  const bool as_expected =
+      names_differ_ && expected_ < columns_ && std::strcmp(Text(0, expected_), name) == 0;
+  const std::size_t column = as_expected ? expected_ : ColumnOf(name);
+  expected_ = column + 1;
+  return column < columns_ && row < rows_ ? Text(std::size_t{row} + 1, column) : "";
+}
+
+void DBResult_tag::AddText(const char* text) {
+  const std::size_t length = std::strlen(text);  // a zero within the value ends it
+  cells_.push_back(length == 0 ? kEmpty : text_.size());
+  if (length != 0) {
+    text_.append(text, length + 1);
   }
-  const std::size_t cell = row * static_cast<std::size_t>(columns_) + column->second;
-  return text_.data() + cells_[cell];
+}
+
+const char* DBResult_tag::Text(std::size_t row, std::size_t column) const {
+  return text_.data() + cells_[row * columns_ + column];
+}
+
+// The first column of that name among those known so far; columns_ when there is none.
+std::size_t DBResult_tag::ColumnOf(const char* name) const {
+  const std::size_t known = std::min(cells_.size(), columns_);
+  std::size_t column = 0;
+  while (column < known && std::strcmp(Text(0, column), name) != 0) {
+    ++column;
+  }
+  return column < known ? column : columns_;
 }
 
 int TUVODBFetchRow(DBResult_tag* result, unsigned int* row) {

@@ -5,8 +5,6 @@
 #include <tuvoplatform/database.h>
 
 #include <cstddef>
-#include <functional>
-#include <map>
 #include <string>
 #include <vector>
 
@@ -24,19 +22,28 @@ struct DBResult_tag {
   // does not fit.
   void AddRow(sqlite3_stmt* statement);
 
+  // To be called behind the last row: gives back the room that was made for more rows.
+  void Finish();
+
   // Stores the index of the next row in `*row` and moves on; false when there is none.
   bool NextRow(unsigned int* row);
 
-  // The text of a cell; empty when there is no such row or column.
-  const char* Field(unsigned int row, const char* name) const;
+  // The text of a cell, valid as long as the result; empty when there is no such row or column. Of
+  // columns of the same name it is the first one's.
+  const char* Field(unsigned int row, const char* name);
 
  private:
-  const int columns_;
-  std::map<std::string, std::size_t, std::less<>> column_of_;  // the first of equal names
-  std::string text_;                                           // zero-terminated cell texts
-  std::vector<std::size_t> cells_;                             // row by row, offsets into text_
+  void AddText(const char* text);
+  const char* Text(std::size_t row, std::size_t column) const;
+  std::size_t ColumnOf(const char* name) const;
+
+  const std::size_t columns_;
+  std::string text_;                // zero-terminated texts
+  std::vector<std::size_t> cells_;  // offsets into text_: the columns' names, then row by row
   unsigned int rows_ = 0;
   unsigned int next_ = 0;
+  bool names_differ_ = true;
+  std::size_t expected_ = 0;  // columns are mostly asked for in their order
 };
 
 #endif  // PLATFORM_SRC_DATABASE_RESULT_H_

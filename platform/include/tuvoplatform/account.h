@@ -12,21 +12,21 @@ extern "C" {
 
 // A user record, freed with TUVOUserFree. The name and the uid are the first two members.
 typedef struct TUVOUSER {
-  char* szName;
-  unsigned int nUid;
+  char* szName;       // the account's real name
+  unsigned int nUid;  // its uid
   unsigned int nGid;  // the account's primary group
 } TUVOUSER;
 
 // A group record, freed with TUVOGroupFree.
 typedef struct TUVOGROUP_tag {
-  char* szName;
-  unsigned int nGid;
+  char* szName;       // the group's name
+  unsigned int nGid;  // its gid
 } TUVOGROUP;
 
 // A list of texts, freed with TLIBCSzHashFree. Items keep their order and are never null.
 typedef struct TLIBSZHASH_tag {
-  int nItem;
-  char** rgszItem;
+  int nItem;        // the number of texts
+  char** rgszItem;  // the texts, zero-terminated
 } TLIBSZHASH;
 
 // Converts the name that a person typed into the account's real name. Returns the length of the

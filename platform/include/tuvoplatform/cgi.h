@@ -20,17 +20,17 @@ extern "C" {
 
 // A context on the caller's stack; its members are the platform's own.
 typedef struct TUVOCGI_tag {
-  void* request;
-  int cookies_loaded;
+  void* request;       // what was parsed
+  int cookies_loaded;  // whether TuvoCgiLoadInCookies was called
 } TUVOCGI;
 
 // An account login. The members are in the order that the platform fixes.
 typedef struct LoginInfo_tag {
-  const char* szUser;
-  const char* szPassword;
-  const char* szClient;  // name of the client program; also the name of the PAM service
-  int nType;             // 15: a login with a password over the web; not looked at on plain Linux
-  int nFlag;             // 1: no session of the appliance's own; not looked at on plain Linux
+  const char* szUser;      // the account's name
+  const char* szPassword;  // its password
+  const char* szClient;    // name of the client program; also the name of the PAM service
+  int nType;               // 15: a login with a password over the web; not looked at on plain Linux
+  int nFlag;               // 1: no session of the appliance's own; not looked at on plain Linux
 } LoginInfo;
 
 // Stores up to `length` further bytes of a request's body in `data` and returns how many; 0 at the

@@ -16,7 +16,7 @@ struct sqlite3;
 // What every connection handle begins with: the SQLite connection it holds, for the few SQLite
 // calls that this interface has no function for. The caller never closes `sqlite`.
 typedef struct TUVODB_tag {
-  struct sqlite3* sqlite;
+  struct sqlite3* sqlite;  // the connection of SQLite's own
 } TUVODB;
 
 // The rows of one statement, as text. Freed with TUVODBFreeResult.
