@@ -79,7 +79,7 @@ def _target(what, value, most):
 def growth(results):
     """How the check grows from a thousand links to a million, against the floor; None without."""
     by_links = {result["links"]: result for result in results
-                if result["operation"] == "check" and result["row"] != "fresh_process"}
+                if result["row"].startswith("check")}
     if not {table.SMALL, table.LARGE} <= by_links.keys():
         return None
     grown = {side: by_links[table.LARGE][side]["cpu"]["median"] /

@@ -53,4 +53,6 @@ ROWS = [
     Row("purge_entries 100k", "purge_entries", links=SMALL, expired=EXPIRED, cpu_target=PURGE,
         most=1, pairs=5, countable=False),
     Row("fresh_process", "check", cpu_target=PROCESS, process=True, most=60),
+    # Beside a floor that loads the C++ library and jsoncpp, which any program with records does.
+    Row("fresh_process C++", "check", process=True, json=True, most=60),
 ]

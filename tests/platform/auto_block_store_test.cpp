@@ -212,6 +212,15 @@ TEST_F(AutoBlockStoreTest, ForgettingLiftsTheDenialOfThatVisitorOnly) {
   EXPECT_TRUE(IsDenied("192.0.2.2"));
 }
 
+TEST_F(AutoBlockStoreTest, ForgettingNothingDoesNotWaitForAWriter) {
+  Count("192.0.2.2", 1, limits_);
+  sqlite3* writer = nullptr;
+  ASSERT_EQ(sqlite3_open(kPath, &writer), SQLITE_OK);
+  EXPECT_EQ(sqlite3_exec(writer, "BEGIN IMMEDIATE", nullptr, nullptr, nullptr), SQLITE_OK);
+  EXPECT_NO_THROW(AutoBlockStore(kPath).Forget(kVisitor));  // the wait would end in an exception
+  sqlite3_close(writer);
+}
+
 TEST_F(AutoBlockStoreTest, ForgettingClearsTheCountAtEveryService) {
   Count(kVisitor, 9, limits_, "WEB");
   Count(kVisitor, 9, limits_, "FTP");

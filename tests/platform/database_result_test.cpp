@@ -114,7 +114,9 @@ TEST_F(DatabaseResult, ColumnNamesAreComparedByteByByte) {
 }
 
 TEST_F(DatabaseResult, FirstOfEquallyNamedColumnsCounts) {
-  EXPECT_EQ("1", Field(Query(db_, "SELECT 1 AS v, 2 AS v"), 0, "v"));
+  const Rows rows = Query(db_, "SELECT 1 AS v, 2 AS v");
+  EXPECT_EQ("1", Field(rows, 0, "v"));
+  EXPECT_EQ("1", Field(rows, 0, "v"));  // columns are expected in their order
 }
 
 TEST_F(DatabaseResult, RowsCanBeReadInAnyOrderAndAgain) {
