@@ -4,6 +4,9 @@
 #include <limits>
 #include <type_traits>
 
+// Not every platform has it.
+extern "C" __attribute__((weak)) void TUVODBForgetRows(DBResult_tag* result, unsigned int row);
+
 namespace TUVO::sharing::db {
 
 namespace {
@@ -60,6 +63,12 @@ unsigned int RowValues::UInt(const char* column, unsigned int def) const {
 
 long RowValues::Time(const char* column, long def) const {
   return ReadNumber(Bytes(column), def, &Field::AsTime);
+}
+
+void RowValues::ForgetEarlier() const {
+  if (TUVODBForgetRows != nullptr) {
+    TUVODBForgetRows(row_.result_, row_.row_);
+  }
 }
 
 }  // namespace TUVO::sharing::db

@@ -144,13 +144,19 @@ bool ReadMembers(Json::Value& data, Document& document) {
       {SZK_REDIRECT_TYPE, ReadInto<&Document::redirect_type>},
       {SZK_REDIRECT_URI, ReadInto<&Document::redirect_uri>},
   }};
+  std::size_t next = 0;  // documents have their members in the order of the names, as the table has
   for (auto value = data.begin(); value != data.end(); ++value) {
     const char* end = nullptr;
     const char* const begin = value.memberName(&end);
     const std::string_view name(begin, static_cast<std::size_t>(end - begin));
-    for (const Member& member : members) {
-      if (member.name == name && !member.read(*value, document)) {
-        return false;
+    for (std::size_t tried = 0; tried < members.size(); ++tried) {
+      const Member& member = members[next];
+      next = (next + 1) % members.size();
+      if (member.name == name) {
+        if (!member.read(*value, document)) {
+          return false;
+        }
+        break;
       }
     }
   }

@@ -3,6 +3,7 @@
 #define INTERNAL_OBJECT_DB_QUERY_H_
 
 #include <internal/contained.h>
+#include <internal/row_values.h>
 #include <tuvosharing/base_db.h>
 #include <tuvosharing/condition.h>
 #include <tuvosharing/object_db.h>
@@ -44,6 +45,7 @@ bool ObjectDB::Query(std::vector<Record>& out) const {
     std::vector<Record> records;
     records.reserve(rows.size());
     for (const Row& row : rows) {
+      RowValues(row).ForgetEarlier();  // or all records would be there beside all texts
       records.emplace_back();
       if (!records.back().FromRow(row)) {
         records.pop_back();

@@ -26,6 +26,10 @@ class RowValues {
   unsigned int UInt(const char* column, unsigned int def) const;
   long Time(const char* column, long def) const;
 
+  // For who reads row after row: the rows before this one are not looked at any more, and a
+  // platform that can gives their memory back.
+  void ForgetEarlier() const;
+
  private:
   const Row& row_;
 };

@@ -10,13 +10,13 @@
 
 namespace {
 
-// Where the empty text lies, for the many cells that are NULL or empty.
-constexpr std::size_t kEmpty = 0;
+// For the many cells that are NULL or empty.
+constexpr char kEmpty[] = "";
 
-// Bytes of text: what a row of any table needs with its columns' names, and what is worth copying
-// once to give memory back.
-constexpr std::size_t kShortResult = 512;
-constexpr std::size_t kLongResult = std::size_t{1024} * 1024;
+// Bytes of a block: the first one has room for a row of any table with its columns' names, and each
+// further one for twice as much, up to a size where a block more or less does not matter.
+constexpr std::size_t kFirstBlock = 1024;
+constexpr std::size_t kLargestBlock = std::size_t{256} * 1024;
 
 // The text of one column of the current row, never null. SQLite ends it with a zero whatever the
 // column's type is.
@@ -35,8 +35,7 @@ const char* ColumnText(sqlite3_stmt* statement, int column) {
 }  // namespace
 
 DBResult_tag::DBResult_tag(sqlite3_stmt* statement)
-    : columns_(static_cast<std::size_t>(sqlite3_column_count(statement))), text_(1, '\0') {
-  text_.reserve(kShortResult);
+    : columns_(static_cast<std::size_t>(sqlite3_column_count(statement))) {
   cells_.reserve(2 * columns_);
   for (int column = 0; static_cast<std::size_t>(column) < columns_; ++column) {
     const char* name = sqlite3_column_name(statement, column);
@@ -58,13 +57,6 @@ void DBResult_tag::AddRow(sqlite3_stmt* statement) {
   ++rows_;
 }
 
-void DBResult_tag::Finish() {
-  if (text_.size() > kLongResult) {
-    text_.shrink_to_fit();
-    cells_.shrink_to_fit();
-  }
-}
-
 bool DBResult_tag::NextRow(unsigned int* row) {
   if (next_ == rows_) {
     return false;
@@ -78,19 +70,42 @@ const char* DBResult_tag::Field(unsigned int row, const char* name) {
       names_differ_ && expected_ < columns_ && std::strcmp(Text(0, expected_), name) == 0;
   const std::size_t column = as_expected ? expected_ : ColumnOf(name);
   expected_ = column + 1;
-  return column < columns_ && row < rows_ ? Text(std::size_t{row} + 1, column) : "";
+  const bool there = column < columns_ && row < rows_ && row >= first_kept_;
+  return there ? Text(std::size_t{row} + 1, column) : kEmpty;
 }
 
-void DBResult_tag::AddText(const char* text) {
-  const std::size_t length = std::strlen(text);  // a zero within the value ends it
-  cells_.push_back(length == 0 ? kEmpty : text_.size());
-  if (length != 0) {
-    text_.append(text, length + 1);
+void DBResult_tag::Forget(unsigned int row) {
+  first_kept_ = std::max(first_kept_, row);
+  while (forgotten_blocks_ < blocks_.size() && blocks_[forgotten_blocks_].last_row < first_kept_) {
+    blocks_[forgotten_blocks_++].texts.reset();
   }
 }
 
+void DBResult_tag::AddText(const char* text) {
+  const std::size_t size = std::strlen(text) + 1;  // a zero within the value ends it
+  if (size == 1) {
+    cells_.push_back(kEmpty);
+    return;
+  }
+  if (size > left_) {
+    AddBlock(size);
+  }
+  blocks_.back().last_row = rows_;
+  cells_.push_back(static_cast<const char*>(std::memcpy(free_, text, size)));
+  free_ += size;
+  left_ -= size;
+}
+
+void DBResult_tag::AddBlock(std::size_t needed) {
+  const std::size_t size =
+      std::max(needed, std::clamp(2 * block_size_, kFirstBlock, kLargestBlock));
+  blocks_.push_back({std::unique_ptr<char[]>(new char[size]), rows_});
+  free_ = blocks_.back().texts.get();
+  left_ = block_size_ = size;
+}
+
 const char* DBResult_tag::Text(std::size_t row, std::size_t column) const {
-  return text_.data() + cells_[row * columns_ + column];
+  return cells_[row * columns_ + column];
 }
 
 // The first column of that name among those known so far; columns_ when there is none.
@@ -109,6 +124,12 @@ int TUVODBFetchRow(DBResult_tag* result, unsigned int* row) {
 
 const char* TUVODBFetchField(DBResult_tag* result, unsigned int row, const char* name) {
   return result != nullptr && name != nullptr ? result->Field(row, name) : "";
+}
+
+void TUVODBForgetRows(DBResult_tag* result, unsigned int row) {
+  if (result != nullptr) {
+    result->Forget(row);
+  }
 }
 
 void TUVODBFreeResult(DBResult_tag* result) {

@@ -5,13 +5,14 @@
 #include <tuvoplatform/database.h>
 
 #include <cstddef>
-#include <string>
+#include <memory>
 #include <vector>
 
 struct sqlite3_stmt;
 
-// All texts lie in one buffer and a cell is an offset into it: a purge or a listing reads rows by
-// the hundred thousand, and an allocation for every cell would cost more than the reading.
+// Texts lie one behind the other in a few blocks: a purge or a listing reads rows by the hundred
+// thousand, and an allocation for every cell would cost more than the reading. Blocks stay where
+// they are while rows come in, and go one by one when rows are forgotten.
 struct DBResult_tag {
  public:
   // Takes the column names of `statement`, which has been stepped at least once: the first step may
@@ -22,26 +23,38 @@ struct DBResult_tag {
   // does not fit.
   void AddRow(sqlite3_stmt* statement);
 
-  // To be called behind the last row: gives back the room that was made for more rows.
-  void Finish();
-
   // Stores the index of the next row in `*row` and moves on; false when there is none.
   bool NextRow(unsigned int* row);
 
-  // The text of a cell, valid as long as the result; empty when there is no such row or column. Of
-  // columns of the same name it is the first one's.
+  // The text of a cell, valid as long as the result and until the row is forgotten; empty when
+  // there is no such row or column. Of columns of the same name it is the first one's.
   const char* Field(unsigned int row, const char* name);
 
+  // The rows before `row` are of no interest any more: they read as empty texts, and memory that
+  // holds nothing else is freed.
+  void Forget(unsigned int row);
+
  private:
+  struct Block {
+    std::unique_ptr<char[]> texts;
+    unsigned int last_row;  // the last row that has a text in it
+  };
+
   void AddText(const char* text);
+  void AddBlock(std::size_t needed);
   const char* Text(std::size_t row, std::size_t column) const;
   std::size_t ColumnOf(const char* name) const;
 
   const std::size_t columns_;
-  std::string text_;                // zero-terminated texts
-  std::vector<std::size_t> cells_;  // offsets into text_: the columns' names, then row by row
+  std::vector<const char*> cells_;  // the columns' names, then row by row
+  std::vector<Block> blocks_;       // the first one keeps the names
+  std::size_t forgotten_blocks_ = 1;
+  std::size_t block_size_ = 0;  // of the last one
+  char* free_ = nullptr;        // in the last one
+  std::size_t left_ = 0;
   unsigned int rows_ = 0;
   unsigned int next_ = 0;
+  unsigned int first_kept_ = 0;
   bool names_differ_ = true;
   std::size_t expected_ = 0;  // columns are mostly asked for in their order
 };

@@ -50,7 +50,6 @@ int RunOnce(sqlite3* sqlite, const char* sql, const char** tail,
   if (code != SQLITE_DONE) {
     return code;
   }
-  result->Finish();
   *rows = std::move(result);
   return SQLITE_OK;
 }

@@ -1,4 +1,5 @@
 #include <gtest/gtest.h>
+#include <malloc.h>
 #include <tuvoplatform/database.h>
 
 #include <chrono>
@@ -154,6 +155,71 @@ TEST_F(DatabaseResult, ChangedTableShowsItsNewColumns) {
 
 TEST_F(DatabaseResult, FreeingNullIsAccepted) {
   TUVODBFreeResult(nullptr);
+}
+
+TEST_F(DatabaseResult, ForgottenRowsReadAsEmptyTextAndTheOthersStay) {
+  const Rows rows = Query(db_, "VALUES ('a', 'b'), ('c', 'd'), ('e', 'f')");
+  const char* kept = TUVODBFetchField(rows.get(), 2, "column2");
+  TUVODBForgetRows(rows.get(), 2);
+  EXPECT_EQ("", Field(rows, 0, "column1"));
+  EXPECT_EQ("", Field(rows, 1, "column2"));
+  EXPECT_EQ("e", Field(rows, 2, "column1"));
+  EXPECT_STREQ("f", kept);
+}
+
+TEST_F(DatabaseResult, WhatIsForgottenStaysForgotten) {
+  const Rows rows = Query(db_, "VALUES ('a'), ('b'), ('c')");
+  TUVODBForgetRows(rows.get(), 2);
+  TUVODBForgetRows(rows.get(), 1);
+  EXPECT_EQ("", Field(rows, 1, "column1"));
+}
+
+TEST_F(DatabaseResult, AllRowsAndMoreCanBeForgotten) {
+  const Rows rows = Query(db_, "VALUES ('a'), ('b')");
+  TUVODBForgetRows(rows.get(), 1000);
+  EXPECT_EQ("", Field(rows, 1, "column1"));
+  unsigned int row = 99;
+  EXPECT_EQ(0, TUVODBFetchRow(rows.get(), &row));
+  EXPECT_EQ(0U, row);
+}
+
+TEST_F(DatabaseResult, ForgettingRowsOfNullIsAccepted) {
+  TUVODBForgetRows(nullptr, 1);
+}
+
+// Texts of all lengths, so that they lie at and across the ends of whatever holds them.
+TEST_F(DatabaseResult, RowsAreWholeWhereverTheyLieWhileOthersAreForgotten) {
+  const Rows rows = Query(db_,
+                          "WITH RECURSIVE c(x) AS (SELECT 0 UNION ALL SELECT x + 1 FROM c LIMIT "
+                          "3000) SELECT x AS id, substr(hex(zeroblob(2000)), 1, x) AS text, "
+                          "'end' || x AS last FROM c");
+  for (unsigned int row = 0; row < 3000; ++row) {
+    TUVODBForgetRows(rows.get(), row);
+    ASSERT_EQ(std::to_string(row), Field(rows, row, "id"));
+    ASSERT_EQ(std::string(row, '0'), Field(rows, row, "text"));
+    ASSERT_EQ("end" + std::to_string(row), Field(rows, row, "last"));
+  }
+}
+
+size_t HeapInUse() {
+  const struct mallinfo2 heap = mallinfo2();
+  return heap.uordblks + heap.hblkhd;
+}
+
+TEST_F(DatabaseResult, ForgettingRowsGivesTheirMemoryBack) {
+#ifdef __SANITIZE_ADDRESS__
+  GTEST_SKIP() << "the address sanitizer's heap does not say what is in use";
+#endif
+  constexpr size_t kBytes = size_t{20} * 1000 * 1000;
+  const Rows rows = Query(db_,
+                          "WITH RECURSIVE c(x) AS (SELECT 1 UNION ALL SELECT x + 1 FROM c LIMIT "
+                          "20000) SELECT hex(zeroblob(500)) AS text FROM c");
+  const size_t all = HeapInUse();
+  TUVODBForgetRows(rows.get(), 10000);
+  const size_t half = HeapInUse();
+  EXPECT_GT(all - half, kBytes * 9 / 20);
+  TUVODBForgetRows(rows.get(), 20000);
+  EXPECT_GT(half - HeapInUse(), kBytes * 9 / 20);
 }
 
 // A cost per row that grew with the number of rows would take minutes here.

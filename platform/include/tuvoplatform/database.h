@@ -56,6 +56,11 @@ TUVOPLATFORM_API int TUVODBFetchRow(struct DBResult_tag* result, unsigned int* r
 TUVOPLATFORM_API const char* TUVODBFetchField(struct DBResult_tag* result, unsigned int row,
                                               const char* name);
 
+// For who reads row after row: the rows before `row` read as empty texts from now on, and texts of
+// theirs that were handed out are no longer valid. Frees the memory that held nothing else. A null
+// result is accepted.
+TUVOPLATFORM_API void TUVODBForgetRows(struct DBResult_tag* result, unsigned int row);
+
 // Frees a result; null is accepted.
 TUVOPLATFORM_API void TUVODBFreeResult(struct DBResult_tag* result);
 
