@@ -40,7 +40,6 @@ target_link_libraries(
 target_link_options(tuvosharing PRIVATE "-Wl,--version-script=${version_script}"
                                         -Wl,-Bsymbolic-functions)
 
-configure_file("${PROJECT_SOURCE_DIR}/cmake/tuvosharing.pc.in" tuvosharing.pc @ONLY)
 configure_package_config_file(
   "${PROJECT_SOURCE_DIR}/cmake/tuvosharing-config.cmake.in" tuvosharing-config.cmake
   INSTALL_DESTINATION "${CMAKE_INSTALL_LIBDIR}/cmake/tuvosharing")
@@ -55,9 +54,10 @@ install(
 install(FILES "${PROJECT_BINARY_DIR}/tuvosharing-config.cmake"
               "${PROJECT_BINARY_DIR}/tuvosharing-config-version.cmake"
         DESTINATION "${CMAKE_INSTALL_LIBDIR}/cmake/tuvosharing")
-install(FILES "${PROJECT_BINARY_DIR}/tuvosharing.pc"
-        DESTINATION "${CMAKE_INSTALL_LIBDIR}/pkgconfig")
+tuvo_pkg_config(tuvosharing)
 install(DIRECTORY "${PROJECT_SOURCE_DIR}/include/tuvosharing"
         DESTINATION "${CMAKE_INSTALL_INCLUDEDIR}")
+file(GLOB pages CONFIGURE_DEPENDS "${PROJECT_SOURCE_DIR}/packaging/man/*.3")
+install(FILES ${pages} DESTINATION "${CMAKE_INSTALL_MANDIR}/man3")
 install(FILES "${PROJECT_SOURCE_DIR}/schema/1.sql" "${PROJECT_SOURCE_DIR}/schema/2.sql"
         DESTINATION share/tuvosharing/db_schema)

@@ -1,7 +1,7 @@
 #!/usr/bin/env bash
 # Runs under scripts/private-root, whose /usr/tuvo is private: installs the build there, as on the
-# appliance, then builds and runs a C program and the C++ example of README.md against it, outside
-# the project, once through pkg-config and once through the CMake package.
+# appliance, then builds and runs programs in C and C++ and the example of README.md against it,
+# outside the project, once through pkg-config and once through the CMake package.
 #
 #   consumer_test.sh BUILD_FOLDER PROJECT_FOLDER
 set -eu
@@ -21,7 +21,7 @@ outside=/tmp/outside
 mkdir "$outside"
 cp "$here"/consumer/* "$outside"
 "$here/readme_example" cpp <"$project/README.md" >"$outside/example.cpp"
-"$here/readme_example" text <"$project/README.md" >"$outside/expected"
+"$here/readme_example" console <"$project/README.md" | grep -v '^\$ ' >"$outside/expected"
 [ -s "$outside/example.cpp" ] && [ -s "$outside/expected" ] || fail "no example in README.md"
 cmake --install "$build" >/dev/null
 
@@ -33,6 +33,8 @@ run() {
 
 check_programs() {
   run REMOTE_ADDR=192.0.2.7 "$1/c_program" || fail "$1/c_program"
+  run REMOTE_ADDR=192.0.2.7 "$1/cpp_program" || fail "$1/cpp_program"
+  run "$1/platform_program" || fail "$1/platform_program"
   run REMOTE_ADDR=192.0.2.7 "$1/example" >"$1/output" || fail "$1/example ended with $?"
   diff "$outside/expected" "$1/output" || fail "$1/example wrote something else"
   [ "$(stat -c %u:%g:%a /usr/tuvo/etc/private/session/sharing.db)" = 1:1:660 ] ||
@@ -52,9 +54,14 @@ warnings="-Wall -Wextra -Wpedantic -Werror"
 mkdir with_pkg_config
 # shellcheck disable=SC2046,SC2086
 cc -std=c99 $warnings c_program.c -o with_pkg_config/c_program $(pkg-config --cflags --libs tuvosharing)
+for name in cpp_program example; do
+  # shellcheck disable=SC2046,SC2086
+  c++ -std=c++17 $warnings $name.cpp -o with_pkg_config/$name \
+    $(pkg-config --cflags --libs tuvosharing)
+done
 # shellcheck disable=SC2046,SC2086
-c++ -std=c++17 $warnings example.cpp -o with_pkg_config/example \
-  $(pkg-config --cflags --libs tuvosharing)
+c++ -std=c++17 $warnings platform_program.cpp -o with_pkg_config/platform_program \
+  $(pkg-config --cflags --libs tuvoplatform)
 check_programs "$outside/with_pkg_config"
 
 # through_cmake FOLDER VERSION: configures and builds the project there, asking for that version.
