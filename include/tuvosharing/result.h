@@ -13,6 +13,7 @@ namespace TUVO::sharing::db {
 // statement.
 class TUVOSHARING_API Result {
  public:
+  // Holds no handle.
   Result();
   // Takes ownership of the handle; null is "none".
   explicit Result(DBResult_tag* result);
