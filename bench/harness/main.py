@@ -10,6 +10,7 @@ import pathlib
 import platform
 import sys
 
+import ending
 import floor_check
 import kept_counts
 import pairs
@@ -18,7 +19,7 @@ import rows as table
 import table as printed
 import workplace
 
-QUICK_PAIRS, PAIRS = 3, 11
+QUICK_PAIRS, PAIRS, MOST_PAIRS = 3, 11, 15
 COUNTED_OPERATIONS = 10
 
 
@@ -45,6 +46,8 @@ def options():
     given = parser.parse_args()
     if (given.check or given.write) and not given.instructions:
         parser.error("--check and --write need --instructions")
+    if given.pairs is not None and not 1 <= given.pairs <= MOST_PAIRS:
+        parser.error(f"--pairs takes 1 to {MOST_PAIRS}: a logout needs a visitor of its own each time")
     return given
 
 
@@ -128,6 +131,7 @@ def count_instructions(place, given):
 
 
 def main():
+    ending.by_exception()
     given = options()
     place = workplace.Workplace(given.build_dir)
     about = machine()

@@ -58,9 +58,12 @@ def _tell(problem):
 
 
 def _install_packages(packages):
-    """By the project's own way, which starts no service; nor does the next boot."""
-    script = ('. scripts/lib/packages.sh; tuvo_apt_install "$@"; '
-              'if [ -e /etc/init.d/php8.2-fpm ]; then update-rc.d php8.2-fpm disable; fi')
+    """By the project's own way, which starts no service; nor does the next boot start one that was
+    not there before."""
+    script = ('. scripts/lib/packages.sh; there=; [ ! -e /etc/init.d/php8.2-fpm ] || there=1; '
+              'tuvo_apt_install "$@"; '
+              'if [ -z "$there" ] && [ -e /etc/init.d/php8.2-fpm ]; then '
+              'update-rc.d php8.2-fpm disable; fi')
     done = subprocess.run(["bash", "-c", script, "packages", *packages], cwd=PROJECT)
     _tell(done.returncode and f"could not install {' '.join(packages)}")
 

@@ -19,6 +19,8 @@ import sys
 import tempfile
 
 sys.path.insert(0, os.path.dirname(os.path.abspath(__file__)))
+sys.path.append(os.path.join(os.path.dirname(os.path.abspath(__file__)), "..", "harness"))
+import ending  # noqa: E402
 import installing  # noqa: E402
 import job  # noqa: E402
 import load  # noqa: E402
@@ -229,4 +231,5 @@ def main():
 
 
 if __name__ == "__main__":
+    ending.by_exception()
     main()

@@ -45,6 +45,7 @@ DBResult_tag::DBResult_tag(sqlite3_stmt* statement)
     names_differ_ = names_differ_ && ColumnOf(name) == columns_;
     AddText(name);
   }
+  forgotten_blocks_ = blocks_.size();
 }
 
 void DBResult_tag::AddRow(sqlite3_stmt* statement) {

@@ -47,8 +47,8 @@ struct DBResult_tag {
 
   const std::size_t columns_;
   std::vector<const char*> cells_;  // the columns' names, then row by row
-  std::vector<Block> blocks_;       // the first one keeps the names
-  std::size_t forgotten_blocks_ = 1;
+  std::vector<Block> blocks_;       // those with the names stay
+  std::size_t forgotten_blocks_ = 0;
   std::size_t block_size_ = 0;  // of the last one
   char* free_ = nullptr;        // in the last one
   std::size_t left_ = 0;

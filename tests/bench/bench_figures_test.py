@@ -45,8 +45,11 @@ class KeptCounts(unittest.TestCase):
         self.assertIn("check: 103001 instructions, kept 100000: +3.00 % - TOO MANY",
                       self.printed.getvalue())
 
-    def test_fewer_pass_and_are_to_be_kept(self):
-        self.assertTrue(kept_counts.check({"check": 96000, "login": 200000}))
+    def test_three_per_cent_fewer_pass(self):
+        self.assertTrue(kept_counts.check({"check": 97000, "login": 194000}))
+
+    def test_even_fewer_fail_and_are_to_be_kept(self):
+        self.assertFalse(kept_counts.check({"check": 96000, "login": 200000}))
         self.assertIn("-4.00 % - fallen: keep it, with --write", self.printed.getvalue())
 
     def test_other_packages_are_named(self):

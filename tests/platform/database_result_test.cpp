@@ -201,6 +201,25 @@ TEST_F(DatabaseResult, RowsAreWholeWhereverTheyLieWhileOthersAreForgotten) {
   }
 }
 
+TEST_F(DatabaseResult, LongNamesOfColumnsStayWhileRowsAreForgotten) {
+  std::string sql = "SELECT 'first' AS v";
+  for (int i = 0; i < 60; ++i) {
+    sql += ", 1 AS a_column_with_a_long_name_" + std::to_string(i);
+  }
+  const Rows rows = Query(
+      db_, sql + ", 'last' AS w UNION ALL SELECT 'x'" + [] {
+        std::string row;
+        for (int i = 0; i < 60; ++i) {
+          row += ", 2";
+        }
+        return row + ", 'y'";
+      }());
+  TUVODBForgetRows(rows.get(), 1);
+  EXPECT_EQ("2", Field(rows, 1, "a_column_with_a_long_name_59"));
+  EXPECT_EQ("y", Field(rows, 1, "w"));
+  EXPECT_EQ("x", Field(rows, 1, "v"));
+}
+
 size_t HeapInUse() {
   const struct mallinfo2 heap = mallinfo2();
   return heap.uordblks + heap.hblkhd;
