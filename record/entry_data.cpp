@@ -156,10 +156,11 @@ bool ReadMembers(Json::Value& data, Document& document) {
       {SZK_REDIRECT_URI, ReadInto<&Document::redirect_uri>},
   }};
   std::size_t next = 0;  // documents have their members in the order of the names, as the table has
-  for (auto value = data.begin(); value != data.end(); ++value) {
-    const char* end = nullptr;
-    const char* const begin = value.memberName(&end);
-    const std::string_view name(begin, static_cast<std::size_t>(end - begin));
+  const auto end = data.end();
+  for (auto value = data.begin(); value != end; ++value) {
+    const char* name_end = nullptr;
+    const char* const name_begin = value.memberName(&name_end);
+    const std::string_view name(name_begin, static_cast<std::size_t>(name_end - name_begin));
     for (std::size_t tried = 0; tried < members.size(); ++tried) {
       const Member& member = members[next];
       next = (next + 1) % members.size();

@@ -98,8 +98,7 @@ def through_web(given):
     sys.path.insert(0, str(workplace.PROJECT / "bench" / "web"))
     import web_rows  # pylint: disable=import-outside-toplevel
     found = web_rows.rows(argparse.Namespace(seconds=given.seconds, build=str(given.build_dir)))
-    compared = [f"{text}: {ratio:.2f}" for text, ratio in web_rows.ratios(found)]
-    return found, "\n".join([web_rows.table(found), "", *compared])
+    return found, "\n".join([web_rows.table(found), "", *web_rows.ratios(found)])
 
 
 def machine():

@@ -52,7 +52,7 @@ def rows(options):
 
 
 def ratios(found):
-    """The comparisons that there are targets for: pairs of a text and the median of the rounds."""
+    """The comparisons that there are targets for, a line each with the median of the rounds."""
     by_point = {(row["name"], row["connections"]): row for row in found if "rps" in row}
     in_process = by_point.get((IN_PROCESS, None))
     lines = []
@@ -62,16 +62,22 @@ def ratios(found):
             continue
         # A server with fewer connections than workers cannot keep all of them busy.
         if in_process and connections >= WORKERS:
-            lines.append((f"FastCGI / in process, requests per second, {connections} connections",
-                          _ratio(ours, in_process, "rps")))
+            lines.append(_held(f"FastCGI / in process, requests per second, {connections} connections",
+                               _ratio(ours, in_process, "rps"), least=0.85))
         for (name, others), peer in by_point.items():
             if others == connections and name not in (CGI, FASTCGI):
-                lines.append((f"FastCGI / {name}, requests per second, {connections} connections",
-                              _ratio(ours, peer, "rps")))
+                lines.append(_held(f"FastCGI / {name}, requests per second, {connections} connections",
+                                   _ratio(ours, peer, "rps"), least=5))
                 if connections == CONNECTIONS[-1]:  # which is where it was looked at
-                    lines.append((f"FastCGI / {name}, memory per worker",
-                                  ours["pss_kib"] / peer["pss_kib"]))
+                    lines.append(_held(f"FastCGI / {name}, memory per worker",
+                                       ours["pss_kib"] / peer["pss_kib"], most=0.1))
     return lines
+
+
+def _held(text, ratio, least=None, most=None):
+    kept = ratio >= least if most is None else ratio <= most
+    target = f"at least {least:g}" if most is None else f"at most {most:g}"
+    return f"{text}: {ratio:.2f}, {target}: {'ok' if kept else 'MISSED'}"
 
 
 def _ratio(one, other, key):
@@ -226,8 +232,7 @@ def main():
     print(table(found))
     print("\nLoad average (1, 5, 15 minutes), with that of the measurement itself:",
           *(f"{average:.1f}" for average in os.getloadavg()), end="\n\n")
-    for text, ratio in ratios(found):
-        print(f"{ratio:7.2f}  {text}")
+    print("\n".join(ratios(found)))
 
 
 if __name__ == "__main__":
