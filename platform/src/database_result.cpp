@@ -71,8 +71,10 @@ const char* DBResult_tag::Field(unsigned int row, const char* name) {
       names_differ_ && expected_ < columns_ && std::strcmp(Text(0, expected_), name) == 0;
   const std::size_t column = as_expected ? expected_ : ColumnOf(name);
   expected_ = column + 1;
-  const bool there = column < columns_ && row < rows_ && row >= first_kept_;
-  return there ? Text(std::size_t{row} + 1, column) : kEmpty;
+  if (column >= columns_ || row >= rows_ || row < first_kept_) {
+    return kEmpty;
+  }
+  return Text(std::size_t{row} + 1, column);
 }
 
 void DBResult_tag::Forget(unsigned int row) {
