@@ -3,7 +3,7 @@
 #include <stddef.h>
 
 #define BEFORE_PASSWORD \
-  "{\"app\":{\"path\":\"/volume1/public/report.pdf\"},\"enable_match_ip\":true,"
+  "{\"app\":{\"path\":\"/exports/public/report.pdf\"},\"enable_match_ip\":true,"
 #define LISTS                                                                                      \
   "\"private_data\":{},\"protect_extra_groups\":[],\"protect_extra_users\":[],\"protect_gids\":[]" \
   ","

@@ -78,7 +78,7 @@ int Logout(const bench_target* target) {
 int Create(const bench_target* target) {
   EntryDB entries(SharingDB::Instance());
   Json::Value app(Json::objectValue);
-  app["path"] = "/volume1/public/report.pdf";
+  app["path"] = "/exports/public/report.pdf";
   Entry entry;
   entry.set_project_name(BENCH_PROJECT);
   entry.set_owner_uid(bench_owner(target->turn, target->links));

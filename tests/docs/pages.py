@@ -6,6 +6,8 @@ import re
 
 SHELL = ("sh", "shell", "bash", "console")
 FENCE = re.compile(r"( *)(`{3,}|~{3,})(.*)$")
+# Markdown takes lines that are further in for code as well; nobody would run those.
+INDENTED_COMMAND = re.compile(r" {4,}(sudo|scripts/|cmake|ctest|tuvosharing\w*|\$) ")
 
 
 @dataclasses.dataclass
@@ -56,6 +58,8 @@ def blocks_of(project, page):
         if not fence:
             if "```" in lines[here - 1]:
                 raise ValueError(f"{page}:{here}: a code block begins behind something else")
+            if INDENTED_COMMAND.match(lines[here - 1]):
+                raise ValueError(f"{page}:{here}: a command that stands in no code block")
             continue
         indent, begin, first = len(fence[1]), fence[2], here
         while lines[here].strip() != begin:

@@ -331,11 +331,23 @@ purge_asking() {
     fail "not purged: $asked"
 }
 
+check_nginx() {
+  apt install nginx-light
+  ln -s ../sites-available/tuvosharing /etc/nginx/sites-enabled/
+  nginx -t -q || fail "nginx does not take its configuration"
+  step "nginx takes the packaged configuration"
+}
+
 check_purge() {
+  # As "systemctl enable" does it.
+  local wants=/etc/systemd/system/sockets.target.wants
+  mkdir -p $wants
+  ln -s /lib/systemd/system/tuvosharing-visitors@.socket "$wants/tuvosharing-visitors@1.socket"
   apt purge tuvosharing
   [ -s $session/sharing.db ] || fail "a purge that nobody was asked about took the database"
   for gone in /etc/tuvosharing /etc/pam.d/webui /usr/share/tuvosharing /usr/tuvo/bin \
     /usr/tuvo/etc/tuvosharing.conf /usr/tuvo/etc/autoblock.conf \
+    /etc/nginx/sites-enabled/tuvosharing "$wants/tuvosharing-visitors@1.socket" \
     /etc/lighttpd/conf-available/50-tuvosharing.conf; do
     if [ -e "$gone" ] || [ -L "$gone" ]; then fail "$gone is left after the purge"; fi
   done
@@ -378,7 +390,8 @@ check_purge() {
 check_documentation() {
   apt install "$packages"/tuvosharing-doc_*_all.deb
   local guide
-  for guide in README.md docs/packages.md docs/images/owner-page.png; do
+  for guide in README.md docs/packages.md docs/images/owner-page.png reference/index.html \
+    reference/md_result_codes.html reference/classTUVO_1_1sharing_1_1record_1_1Entry.html; do
     [ -s "/usr/share/doc/tuvosharing/$guide" ] || fail "$guide is missing"
   done
   apt purge tuvosharing-doc
@@ -393,6 +406,7 @@ walk_owners_road
 check_fastcgi
 check_units
 check_upgrade
+check_nginx
 check_removal
 check_purge
 check_documentation

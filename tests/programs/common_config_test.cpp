@@ -82,9 +82,9 @@ constexpr char kNoFolder[] = "names no folder that can be opened for sharing";
 TEST_F(CommonConfig, ValuesAreRead) {
   const Config config = Read(
       "external_address = https://nas.example.org:8443/x\n"
-      "share_folder = /volume1/public\nshare_folder = /volume2\n");
+      "share_folder = /exports/public\nshare_folder = /exports2\n");
   EXPECT_EQ(config.external_address, "https://nas.example.org:8443/x");
-  EXPECT_EQ(config.share_folders, (Texts{"/volume1/public", "/volume2"}));
+  EXPECT_EQ(config.share_folders, (Texts{"/exports/public", "/exports2"}));
   EXPECT_EQ(Logged(), Texts{});
 }
 
@@ -304,7 +304,7 @@ TEST_F(CommonConfig, TheExamplesInThePackagedFileAreOnes) {
   }
   const Config config = Read(examples);
   EXPECT_EQ(config.external_address, "https://nas.example.org");
-  EXPECT_EQ(config.share_folders, Texts{"/volume1/public"});
+  EXPECT_EQ(config.share_folders, Texts{"/srv/public"});
   EXPECT_EQ(Logged(), Texts{});
 }
 

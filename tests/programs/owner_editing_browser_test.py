@@ -16,6 +16,7 @@ class Sending(OwnerTest):
         """What saving these changes sends, without the link's number."""
         before = len(self.sent("set"))
         self.edit(title, **fields)
+        self.forget_notice()
         self.press_in("link", "Save")
         self.assert_no_dialog()
         self.wait_for(lambda: len(self.sent("set")), lambda seen: seen == before + 1)

@@ -165,10 +165,15 @@ class OwnerPage(browser.Browser):
         return self.row(title).find_element(By.CSS_SELECTOR, f"[data-action='{action}']")
 
     def act(self, title, action):
-        self.button(title, action).click()
+        """The list may be made anew while the button is looked for."""
+        self.wait_for(lambda: self.button(title, action).click(), lambda _: True)
 
     def notice(self):
         return self.browser.find_element(By.ID, "notice-text").text
+
+    def forget_notice(self):
+        """So that the next one is not mistaken for one that said the same."""
+        self.browser.execute_script("document.getElementById('notice-text').replaceChildren()")
 
     def assert_notice(self, text):
         self.wait_for(self.notice, lambda seen: text in seen)

@@ -163,19 +163,19 @@ TEST(SharingUrlLink, TheSchemesOwnPortIsLeftOut) {
   EXPECT_EQ(Link("nas", false, 80), "http://nas/sharing/abc");
   EXPECT_EQ(Link("nas", true, 80), "https://nas:80/sharing/abc");
   EXPECT_EQ(Link("nas", false, 443), "http://nas:443/sharing/abc");
-  EXPECT_EQ(Link("nas", true, 5001), "https://nas:5001/sharing/abc");
+  EXPECT_EQ(Link("nas", true, 9443), "https://nas:9443/sharing/abc");
   EXPECT_EQ(Link("nas:443", true, 0), "https://nas/sharing/abc");
 }
 
 TEST(SharingUrlLink, APortOfTheAddressWins) {
-  EXPECT_EQ(Link("nas:8443", true, 5001), "https://nas:8443/sharing/abc");
-  EXPECT_EQ(Link("[::1]:8443", true, 5001), "https://[::1]:8443/sharing/abc");
+  EXPECT_EQ(Link("nas:8443", true, 9443), "https://nas:8443/sharing/abc");
+  EXPECT_EQ(Link("[::1]:8443", true, 9443), "https://[::1]:8443/sharing/abc");
 }
 
 TEST(SharingUrlLink, AWholeAddressWinsAltogether) {
-  EXPECT_EQ(Link("http://nas", true, 5001), "http://nas/sharing/abc");
-  EXPECT_EQ(Link("https://nas", false, 5001), "https://nas/sharing/abc");
-  EXPECT_EQ(Link("https://nas:8443/x", false, 5001), "https://nas:8443/x/sharing/abc");
+  EXPECT_EQ(Link("http://nas", true, 9443), "http://nas/sharing/abc");
+  EXPECT_EQ(Link("https://nas", false, 9443), "https://nas/sharing/abc");
+  EXPECT_EQ(Link("https://nas:8443/x", false, 9443), "https://nas:8443/x/sharing/abc");
   EXPECT_EQ(Link("http://nas:80/", true, 0), "http://nas/sharing/abc");
   EXPECT_EQ(Link("http://nas:443", true, 0), "http://nas:443/sharing/abc");
 }

@@ -18,8 +18,8 @@ std::string Problem(const Arguments& arguments) {
 }
 
 TEST(SharingUrlRequest, ArgumentsAreReadInOrder) {
-  const Request request = std::get<Request>(ReadRequest({"photo", "5001", "1", "nas:80", "a-B_9"}));
-  EXPECT_EQ(request.port, 5001);
+  const Request request = std::get<Request>(ReadRequest({"photo", "9443", "1", "nas:80", "a-B_9"}));
+  EXPECT_EQ(request.port, 9443);
   EXPECT_TRUE(request.https);
   ASSERT_TRUE(request.instead);
   EXPECT_EQ(request.instead->host, "nas");

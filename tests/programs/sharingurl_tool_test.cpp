@@ -137,17 +137,17 @@ class SharingUrlTool : public testing::Test {
 TEST_F(SharingUrlTool, AGivenAddressIsKindTwo) {
   EXPECT_EQ(Output({"photo", "0", "1", "nas.example.org", "Zk3_abcde"}),
             "https://nas.example.org/sharing/Zk3_abcde\n2\n");
-  EXPECT_EQ(Output({"photo", "5001", "0", "2001:db8::9", "Zk3_abcde"}),
-            "http://[2001:db8::9]:5001/sharing/Zk3_abcde\n2\n");
+  EXPECT_EQ(Output({"photo", "9443", "0", "2001:db8::9", "Zk3_abcde"}),
+            "http://[2001:db8::9]:9443/sharing/Zk3_abcde\n2\n");
 }
 
 TEST_F(SharingUrlTool, TheConfiguredAddressIsKindOne) {
   Configure("https://nas.example.org:8443/files/");
-  EXPECT_EQ(Output({"photo", "5000", "0", "", "abc"}),
+  EXPECT_EQ(Output({"photo", "9080", "0", "", "abc"}),
             "https://nas.example.org:8443/files/sharing/abc\n1\n");
   Configure("nas.example.org");
-  EXPECT_EQ(Output({"photo", "5000", "0", "", "abc"}),
-            "http://nas.example.org:5000/sharing/abc\n1\n");
+  EXPECT_EQ(Output({"photo", "9080", "0", "", "abc"}),
+            "http://nas.example.org:9080/sharing/abc\n1\n");
   EXPECT_EQ(listener_.TakeTexts(), Texts{});
 }
 
@@ -246,7 +246,7 @@ TEST_F(SharingUrlTool, WithoutMemoryItFailsAndSaysSo) {
 #endif
   const Texts large(12, std::string(120000, 'x'));
   int without_memory = 0;
-  for (int limit = 500000; limit < 20000000; limit += 500000) {
+  for (int limit = 908000; limit < 20000000; limit += 908000) {
     Texts command{"/usr/bin/prlimit", "--data=" + std::to_string(limit), kTool};
     command.insert(command.end(), large.begin(), large.end());
     const Ran ran = Wait(Start(command, kOutput, {}), kOutput);

@@ -79,7 +79,7 @@ TEST(EntryData, HasEveryFieldFromTheAddressMatchOn) {
     "protect_uids": [2001, 2002], "protect_extra_users": ["nobody-yet"],
     "protect_gids": [3001], "protect_extra_groups": ["no-such-group"],
     "redirect_type": "always", "redirect_uri": "https://example.com/a/page",
-    "app": {"path": ["/volume1/photos", 1, 2.5, null, true]},
+    "app": {"path": ["/exports/photos", 1, 2.5, null, true]},
     "private_data": {"key": {"inner": "secret"}}})");
   expected["protect_password_salt"] = entry.get_protect_password_salt();
   EXPECT_EQ(data, expected);
@@ -416,7 +416,7 @@ TEST(EntryData, KeepsNumbersThatJsonHasNoFormFor) {
 TEST(EntryData, KeepsALargeDocument) {
   Json::Value app(Json::objectValue);
   for (int i = 0; i < 5000; ++i) {
-    app["files"].append("/volume1/photos/'" + std::to_string(i) + "'\xff.jpg");
+    app["files"].append("/exports/photos/'" + std::to_string(i) + "'\xff.jpg");
   }
   ExpectSurvives(LegalEntry().set_app(app).set_protect_title(std::string(300000, '\'')));
 }

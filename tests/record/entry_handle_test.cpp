@@ -219,7 +219,7 @@ TEST(Entry, KeepsWhatItIsGiven) {
   EXPECT_EQ(entry.get_protect_title(), "A title, and a long one");
   EXPECT_EQ(entry.get_redirect_type(), Entry::REDIRECT_ALWAYS);
   EXPECT_EQ(entry.get_redirect_uri(), "https://example.com/a/page");
-  EXPECT_EQ(entry.get_app(), ParseJson(R"({"path":["/volume1/photos",1,2.5,null,true]})"));
+  EXPECT_EQ(entry.get_app(), ParseJson(R"({"path":["/exports/photos",1,2.5,null,true]})"));
   EXPECT_EQ(entry.get_private_data(), ParseJson(R"({"key":{"inner":"secret"}})"));
 }
 

@@ -885,7 +885,7 @@ TEST(EntryJson, HasTheMembersValues) {
     "protect_title": "A title, and a long one", "protect_type": "password",
     "protect_users": ["alice", "bob", "nobody-yet"], "protect_groups": ["friends",
     "no-such-group"], "redirect_type": "always", "redirect_uri": "https://example.com/a/page",
-    "app": {"path": ["/volume1/photos", 1, 2.5, null, true]}})"));
+    "app": {"path": ["/exports/photos", 1, 2.5, null, true]}})"));
 }
 
 TEST(EntryJson, OfADefaultLink) {

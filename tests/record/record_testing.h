@@ -172,7 +172,7 @@ inline TUVO::sharing::record::Entry FullEntry() {
   entry.set_protect_users({"alice", "nobody-yet", "bob"});
   entry.set_protect_groups({"friends", "no-such-group"});
   entry.set_redirect_type(Entry::REDIRECT_ALWAYS).set_redirect_uri("https://example.com/a/page");
-  entry.set_app(ParseJson(R"({"path":["/volume1/photos",1,2.5,null,true]})"));
+  entry.set_app(ParseJson(R"({"path":["/exports/photos",1,2.5,null,true]})"));
   entry.set_private_data(ParseJson(R"({"key":{"inner":"secret"}})"));
   return entry;
 }
