@@ -177,8 +177,8 @@ void Print(const Counts& counts, const ImportOptions& options) {
     PrintJson(json);
     return;
   }
-  std::cout << (options.dry_run ? "would import " : "imported ") << counts.imported
-            << " links, replace" << (options.dry_run ? " " : "d ") << counts.replaced << ", skip"
+  std::cout << (options.dry_run ? "would import " : "imported ") << Counted(counts.imported, "link")
+            << ", replace" << (options.dry_run ? " " : "d ") << counts.replaced << ", skip"
             << (options.dry_run ? " " : "ped ") << counts.skipped << '\n';
 }
 

@@ -17,6 +17,10 @@ void PrintJson(const Json::Value& value) {
   std::cout << JsonLine(value) << '\n';
 }
 
+std::string Counted(long long number, const std::string& thing) {
+  return std::to_string(number) + " " + thing + (number == 1 ? "" : "s");
+}
+
 void Complain(const std::string& text) {
   std::cerr << "tuvosharing: " << Harmless(text) << std::endl;
 }

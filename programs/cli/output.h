@@ -14,6 +14,9 @@ namespace cli {
 void PrintJson(const Json::Value& value);
 std::string JsonLine(const Json::Value& value);
 
+// "1 link", "2 links": the number with the thing's name, in the plural where it has to be.
+std::string Counted(long long number, const std::string& thing);
+
 // One line on standard error: "tuvosharing: " and the text.
 void Complain(const std::string& text);
 

@@ -157,9 +157,10 @@ void Print(const Counts& counts, const PurgeOptions& options) {
     PrintJson(json);
     return;
   }
-  std::cout << (options.dry_run ? "would remove " : "removed ") << counts.links << " links";
+  std::cout << (options.dry_run ? "would remove " : "removed ") << Counted(counts.links, "link");
   if (options.all_kinds) {
-    std::cout << ", " << counts.sessions << " sessions, " << counts.tokens << " tokens";
+    std::cout << ", " << Counted(counts.sessions, "session") << ", "
+              << Counted(counts.tokens, "token");
   }
   std::cout << '\n';
 }

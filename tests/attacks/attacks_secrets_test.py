@@ -141,18 +141,20 @@ class Times(unittest.TestCase):
               file=sys.stderr)
         return {name: min(values) for name, values in times.items()}
 
-    def assert_alike(self, found):
+    def assert_alike(self, requests):
         """None takes more than twice as long as another. This finds what does some more work for
-        one of them, and not a comparison that ends early, which is some nanoseconds."""
-        self.assertLess(max(found.values()), 2 * min(found.values()))
+        one of them, and not a comparison that ends early, which is some nanoseconds. Such work is
+        done every time; what others' load does is not."""
+        self.assertTrue(any(max(found.values()) < 2 * min(found.values())
+                            for found in (self.shortest(requests) for _ in range(5))))
 
     def test_links_that_do_not_open_take_as_long_as_each_other(self):
         off = make_file_link(FILE, enabled=False)
         late = make_file_link(FILE, start_at=int(time.time()) + 3600)
-        self.assert_alike(self.shortest({
+        self.assert_alike({
             "unknown": (variables("nosuchone"), b""),
             "nearly": (variables(off[:-1] + ("a" if off[-1] != "a" else "b")), b""),
-            "switched off": (variables(off), b""), "not begun": (variables(late), b"")}))
+            "switched off": (variables(off), b""), "not begun": (variables(late), b"")})
 
     def test_wrong_passwords_take_as_long_as_each_other(self):
         with open("/usr/tuvo/etc/autoblock.conf", "w") as file:
@@ -164,8 +166,8 @@ class Times(unittest.TestCase):
             body = urllib.parse.urlencode({"password": password}).encode()
             return variables(link, REQUEST_METHOD="POST", CONTENT_LENGTH=str(len(body)),
                              CONTENT_TYPE="application/x-www-form-urlencoded"), body
-        self.assert_alike(self.shortest({
-            "far": form("X" * 21), "near": form("correct horse batterz"), "short": form("c")}))
+        self.assert_alike({
+            "far": form("X" * 21), "near": form("correct horse batterz"), "short": form("c")})
 
 
 def main():

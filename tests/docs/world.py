@@ -137,7 +137,7 @@ def start_web_server(project):
     server = subprocess.Popen(
         ["/usr/sbin/lighttpd", "-D", "-f", f"{project}/packaging/lighttpd/standalone.conf"],
         env={"PATH": SECURE_PATH, "TUVO_PORT": "80", "TUVO_LOG": log})
-    for _ in range(200):
+    for _ in range(1200):
         try:
             socket.create_connection(("127.0.0.1", 80)).close()
             return server

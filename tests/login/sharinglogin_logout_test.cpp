@@ -178,7 +178,7 @@ TEST_F(UseCounting, UndoesNothingThatIsWrittenMeanwhile) {
 // Which waits ten seconds, and must not go on without it then.
 TEST_F(UseCounting, FailsWhenTheFileStaysLocked) {
   const std::string hash = MakeLink();
-  const pid_t writer = StartWriter(kChange, std::chrono::milliseconds(14000));
+  const pid_t writer = StartWriter(kChange, std::chrono::milliseconds(17000));
   EXPECT_EQ(0, CountUse(hash).code);
   int status = -1;
   EXPECT_EQ(writer, waitpid(writer, &status, 0));

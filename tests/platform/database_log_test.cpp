@@ -101,7 +101,7 @@ TEST_F(DatabaseLog, GrowsWhileAReaderStaysAndNobodyWaitsForHim) {
   for (int i = 0; i < 5; ++i) {
     const auto begin = steady_clock::now();
     ASSERT_EQ(0, Execute(writer, kWrite));
-    EXPECT_LT(steady_clock::now() - begin, std::chrono::seconds(4));
+    EXPECT_LT(steady_clock::now() - begin, std::chrono::seconds(9));
   }
   EXPECT_GT(Size(), kBound / 2);
   ASSERT_EQ(0, Execute(reader, "ROLLBACK"));

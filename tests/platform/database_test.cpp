@@ -464,8 +464,8 @@ int HoldLock(const std::string& path, const char* sql, Gate* start, Gate* locked
 bool SqliteAloneWaits(const Db& db, Gate* start, Gate* locked, Gate* done, Process* holder) {
   start->Open();
   locked->Wait();
-  done->Open();
   const Stopwatch watch;
+  done->Open();
   const bool written =
       sqlite3_exec(db->sqlite, "INSERT INTO t VALUES (1)", nullptr, nullptr, nullptr) == SQLITE_OK;
   EXPECT_EQ(0, holder->Wait());
@@ -491,8 +491,8 @@ TEST_F(SharedDatabase, StatementWaitsForTheLockOfAnotherProcess) {
   db_ = Connect(path_);
   start.Open();
   locked.Wait();
-  done.Open();
   const Stopwatch watch;
+  done.Open();
   EXPECT_EQ(0, Execute(db_, "INSERT INTO t VALUES (1)"));
   EXPECT_GT(watch.Elapsed().count(), 800);
   EXPECT_EQ(0, holder.Wait());
@@ -510,7 +510,7 @@ TEST_F(SharedDatabase, StatementGivesUpAfterTenSeconds) {
   const Stopwatch watch;
   EXPECT_EQ(-1, Execute(db_, "INSERT INTO t VALUES (1)"));
   EXPECT_GT(watch.Elapsed().count(), 9500);
-  EXPECT_LT(watch.Elapsed().count(), 12000);
+  EXPECT_LT(watch.Elapsed().count(), 19000);
   EXPECT_EQ("database is locked", Error(db_));
   done.Open();
   EXPECT_EQ(0, holder.Wait());
@@ -532,9 +532,9 @@ TEST_F(SharedDatabase, ChangeOfTheJournalModeIsTriedAgain) {
   ConnectWithLog();
   start.Open();
   locked.Wait();
-  EXPECT_LT(SqliteAloneRefuses(db_, "PRAGMA journal_mode = DELETE"), 500);
-  done.Open();
+  EXPECT_LT(SqliteAloneRefuses(db_, "PRAGMA journal_mode = DELETE"), 5000);
   const Stopwatch watch;
+  done.Open();
   const Rows rows = Query(db_, "PRAGMA journal_mode = DELETE");
   EXPECT_GT(watch.Elapsed().count(), 800);
   ASSERT_NE(nullptr, rows) << Error(db_);
@@ -580,11 +580,11 @@ TEST_F(SharedDatabase, ChangeOfTheJournalModeGivesUpAfterTenSecondsInAll) {
   ConnectWithLog();
   start.Open();
   locked.Wait();
-  EXPECT_LT(SqliteAloneRefuses(db_, "PRAGMA journal_mode = DELETE"), 500);
+  EXPECT_LT(SqliteAloneRefuses(db_, "PRAGMA journal_mode = DELETE"), 5000);
   const Stopwatch watch;
   EXPECT_EQ(-1, Execute(db_, "PRAGMA journal_mode = DELETE"));
   EXPECT_GT(watch.Elapsed().count(), 9500);
-  EXPECT_LT(watch.Elapsed().count(), 12000);
+  EXPECT_LT(watch.Elapsed().count(), 19000);
   EXPECT_EQ("database is locked", Error(db_));
   done.Open();
   EXPECT_EQ(0, holder.Wait());
@@ -614,11 +614,11 @@ TEST_F(SharedDatabase, LockMetByALaterAttemptIsNotWaitedForAnotherTenSeconds) {
   db_ = Connect(path_);
   start.Open();
   locked.Wait();
-  EXPECT_LT(SqliteAloneRefuses(db_, "PRAGMA journal_mode = WAL"), 500);
+  EXPECT_LT(SqliteAloneRefuses(db_, "PRAGMA journal_mode = WAL"), 5000);
   const Stopwatch watch;
   EXPECT_EQ(-1, Execute(db_, "PRAGMA journal_mode = WAL"));
   EXPECT_GT(watch.Elapsed().count(), 9500);
-  EXPECT_LT(watch.Elapsed().count(), 12000);
+  EXPECT_LT(watch.Elapsed().count(), 15500);
   done.Open();
   EXPECT_EQ(0, writer.Wait());
 }
@@ -636,7 +636,7 @@ TEST_F(SharedDatabase, NothingIsTriedAgainInsideATransaction) {
   // What this transaction has read is out of date: it can never write.
   const Stopwatch watch;
   EXPECT_EQ(-1, Execute(db_, "INSERT INTO t VALUES (2)"));
-  EXPECT_LT(watch.Elapsed().count(), 2000);
+  EXPECT_LT(watch.Elapsed().count(), 9000);
   EXPECT_EQ("database is locked", Error(db_));
   EXPECT_TRUE(InTransaction(db_));
   EXPECT_EQ(0, Execute(db_, "ROLLBACK; INSERT INTO t VALUES (2)"));
@@ -658,7 +658,7 @@ TEST_F(SharedDatabase, NothingIsTriedAgainAfterARow) {
   ASSERT_EQ(0, Execute(db_, "PRAGMA busy_timeout = 0"));
   const Stopwatch watch;
   EXPECT_EQ(nullptr, Query(db_, "INSERT INTO t VALUES (1) RETURNING a"));
-  EXPECT_LT(watch.Elapsed().count(), 2000);
+  EXPECT_LT(watch.Elapsed().count(), 9000);
   EXPECT_EQ("database is locked", Error(db_));
   done.Open();
   EXPECT_EQ(0, reader.Wait());

@@ -56,7 +56,7 @@ TEST(DatabaseWait, WhoeverHasWaitedLongerLooksMoreOften) {
   const Db db = Connect(folder / "test.db");
   ASSERT_EQ(0, Execute(holder, "PRAGMA journal_mode = WAL; CREATE TABLE t (a); BEGIN IMMEDIATE"));
   std::thread end([&] {
-    std::this_thread::sleep_for(milliseconds(2600));
+    std::this_thread::sleep_for(milliseconds(4000));
     Execute(holder, "COMMIT");
   });
   std::vector<microseconds> all;

@@ -39,7 +39,7 @@ FLAGS = ("--headless", "--no-sandbox", "--disable-gpu", "--disable-quic", "--no-
          "--disable-background-networking", "--disable-component-update", "--disable-sync",
          "--host-resolver-rules=MAP * ~NOTFOUND, EXCLUDE 127.0.0.1", "--no-proxy-server",
          "--window-size=800,640")
-PATIENCE = 20  # seconds
+PATIENCE = 120  # seconds
 SET_SIZE = "Emulation.setDeviceMetricsOverride"
 
 
@@ -78,8 +78,8 @@ class _Running:
         except BaseException:
             shutil.rmtree(self.profile, ignore_errors=True)
             raise
-        self.browser.set_page_load_timeout(60)
-        self.browser.set_script_timeout(120)
+        self.browser.set_page_load_timeout(300)
+        self.browser.set_script_timeout(300)
         atexit.register(self.end)
 
     def clean(self):
@@ -138,17 +138,18 @@ class Browser:
 
     def wait_for(self, look, wanted):
         """A pressed button or link returns before the next page is there."""
-        seen = None
         end = time.monotonic() + PATIENCE
-        while time.monotonic() < end:
+        while True:
+            late = time.monotonic() > end  # told before the look, which may take long itself
             try:
                 seen = look()
                 if wanted(seen):
                     return
             except (WebDriverException, AssertionError) as missing:  # between two pages
                 seen = missing
+            if late:
+                raise AssertionError(f"the browser ends up with: {seen}")
             time.sleep(0.05)
-        raise AssertionError(f"the browser ends up with: {seen}")
 
     def text(self):
         return self.browser.find_element(By.TAG_NAME, "main").text
@@ -222,7 +223,7 @@ class Browser:
 
     def downloaded(self):
         """Name and content of the file that the browser was sent."""
-        for _ in range(200):
+        for _ in range(PATIENCE * 20):
             names = os.listdir(self.downloads)
             # The browser writes under a hidden name, then under one of its own, before the file's.
             if names and not any(name.startswith(".") or name.endswith(".crdownload")
@@ -244,6 +245,8 @@ class Browser:
         """Of the page itself; narrower than the windows that the browser opens."""
         self.browser.execute_cdp_cmd(SET_SIZE, {
             "width": width, "height": height, "deviceScaleFactor": 1, "mobile": False})
+        self.wait_for(lambda: self.browser.execute_script("return [innerWidth, innerHeight]"),
+                      lambda seen: seen == [width, height])
 
 
 class _Result(unittest.TextTestResult):

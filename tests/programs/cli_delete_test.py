@@ -99,7 +99,7 @@ class Purge(CliTest):
             self.assertEqual([show(link)["state"] for link in expected], [state] * len(expected))
         counts = json.loads(run("purge", "--dry-run", "--json").stdout)
         self.assertEqual(counts["links"], 1)
-        self.assertEqual(run("purge").stdout, "removed 1 links\n")
+        self.assertEqual(run("purge").stdout, "removed 1 link\n")
         self.assertEqual([row[0] for row in sql("SELECT hash FROM entry ORDER BY id")], live)
 
     def test_by_owner_and_project(self):
@@ -114,6 +114,8 @@ class Purge(CliTest):
 
     def test_all_kinds(self):
         self.make_ended()
+        self.assertEqual(run("purge", "--all-kinds", "--dry-run").stdout,
+                         "would remove 2 links, 1 session, 1 token\n")
         counts = json.loads(run("purge", "--all-kinds", "--dry-run", "--json").stdout)
         self.assertEqual(counts, {"links": 2, "sessions": 1, "tokens": 1, "dry_run": True})
         self.assertEqual(len(sql("SELECT * FROM entry")), 3)

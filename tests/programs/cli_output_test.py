@@ -52,14 +52,14 @@ class Unread(CliTest):
             for number in signal.SIGTERM, signal.SIGINT:
                 process = self.start(*arguments)
                 process.send_signal(number)
-                self.assertEqual(process.wait(timeout=10), -number, arguments)
+                self.assertEqual(process.wait(timeout=60), -number, arguments)
                 self.assertEqual(process.stderr.read(), b"")
 
     def test_a_link_that_is_made_is_told_when_its_hash_is_not(self):
         process = self.start("create", "--project", "x",
                              done=lambda: sql("SELECT id FROM entry"))
         process.terminate()
-        self.assertEqual(process.wait(timeout=10), -signal.SIGTERM)
+        self.assertEqual(process.wait(timeout=60), -signal.SIGTERM)
         link = sql("SELECT id FROM entry")[0][0]
         self.assertEqual(process.stderr.read().decode(),
                          f"tuvosharing: the link is made (#{link}); its hash cannot be written\n")
@@ -78,7 +78,7 @@ class Unread(CliTest):
         process = self.start("export", "-")
         sql("UPDATE entry SET use_count = 1")
         process.terminate()
-        process.wait(timeout=10)
+        process.wait(timeout=60)
         connection = sqlite3.connect(DATABASE, timeout=0)
         self.assertEqual(connection.execute("PRAGMA wal_checkpoint(TRUNCATE)").fetchone()[0], 0)
         connection.close()

@@ -14,7 +14,7 @@ from visitor_server import DATABASE, SYSTEM, sql
 
 def first_words(pid):
     """What everybody can read of the command line, until it is down to the program's name."""
-    end = time.monotonic() + 30
+    end = time.monotonic() + 120
     while True:
         with open(f"/proc/{pid}/cmdline", "rb") as file:
             words = file.read().rstrip(b"\0")

@@ -27,7 +27,7 @@ LINK_MEMBERS = {"id", "hash", "project_name", "owner_user", "owner_uid", "state"
                 "redirect_uri", "app"}
 COLUMNS = ("hash, project_name, enabled, owner_uid, start_at, expire_at, expire_times, use_count, "
            "auto_gc, data")
-WAITING = 30  # seconds, for a program at a terminal
+WAITING = 120  # seconds, for a program at a terminal
 
 
 def run(*arguments, text="", uid=0, gid=None, **options):

@@ -143,7 +143,7 @@ class Completion(unittest.TestCase):
             os.execv("/bin/bash", ["bash", "--norc", "-i"])
         seen = b""
         os.write(master, b"source " + COMPLETION.encode() + b"; echo rea''dy\n")
-        end = time.monotonic() + 30
+        end = time.monotonic() + 120
         typed = False
         while b"--dry-run" not in seen and time.monotonic() < end:
             if select.select([master], [], [], 0.2)[0]:

@@ -237,7 +237,7 @@ class Ends(GatewayTest):
     def test_sigterm_ends_an_idle_program(self):
         self.assertEqual(get(self.program, "no-such-link").status, 404)
         self.program.process.terminate()
-        self.assertEqual(self.program.process.wait(30), 0)
+        self.assertEqual(self.program.process.wait(120), 0)
 
     def test_sigterm_lets_the_running_request_end(self):
         link = make_file_link(LARGE)
@@ -252,14 +252,14 @@ class Ends(GatewayTest):
             while piece := connection.recv(1024 ** 2):
                 received += len(piece)
         self.assertGreater(received, os.path.getsize(LARGE))
-        self.assertEqual(self.program.process.wait(30), 0)
+        self.assertEqual(self.program.process.wait(120), 0)
 
     def test_process_ends_by_itself_after_many_requests(self):
         for _ in range(10000):
             with self.program.begin(variables("OPTIONS", "/")) as connection:
                 fastcgi.send_body(connection, b"")
                 self.assertTrue(fastcgi.receive(connection)[1])
-        self.assertEqual(self.program.process.wait(30), 0)
+        self.assertEqual(self.program.process.wait(120), 0)
 
 
 class Database(GatewayTest):
@@ -273,7 +273,7 @@ class Database(GatewayTest):
             with vs.SystemLog():
                 reply = get(self.program, "abcdef")
             self.assertEqual(reply.status, 500)
-            self.assertEqual(self.program.process.wait(30), 1)
+            self.assertEqual(self.program.process.wait(120), 1)
         finally:
             os.rmdir(vs.DATABASE)
             os.rename(vs.DATABASE + ".kept", vs.DATABASE)
@@ -350,7 +350,7 @@ class DeadConnections(GatewayTest):
                 with self.program.begin(variables("GET", "/" + link, cookie=cookie)) as connection:
                     fastcgi.send_body(connection, b"")
                 os.kill(self.program.pid, signal.SIGCONT)
-                for _ in range(100):
+                for _ in range(1200):
                     if any("event=download" in line for line in log.lines):
                         break
                     time.sleep(0.05)
@@ -364,7 +364,7 @@ class Sockets(unittest.TestCase):
     def test_of_the_network_is_refused(self):
         with vs.SystemLog() as log:
             with fastcgi.Spawned(vs.PROGRAM, vs.WWW_DATA, family=socket.AF_INET) as program:
-                self.assertEqual(program.process.wait(30), 1)
+                self.assertEqual(program.process.wait(120), 1)
         self.assertRegex("\n".join(log.lines), r"gateway:\d+ the FastCGI socket is no local one")
 
 

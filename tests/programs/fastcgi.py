@@ -57,7 +57,7 @@ class Spawned:
         if self.process.poll() is None:
             self.process.terminate()
         try:
-            self.process.wait(30)
+            self.process.wait(120)
         except subprocess.TimeoutExpired:
             self.process.kill()
             raise

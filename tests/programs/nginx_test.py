@@ -78,13 +78,13 @@ class Nginx:
     def __enter__(self):
         os.mkdir("/tmp/nginx", 0o755)
         os.chown("/tmp/nginx", vs.WWW_DATA, vs.WWW_DATA)
-        ports = set()
-        while len(ports) < 3:
-            ports.add(vs.free_port())
-        self.port, self.lenient, self.secure = ports
         subprocess.run(["openssl", "req", "-x509", "-newkey", "rsa:2048", "-nodes", "-days", "2",
                         "-subj", "/CN=localhost", "-keyout", "/tmp/nginx/key",
                         "-out", "/tmp/nginx/certificate"], check=True, stderr=subprocess.DEVNULL)
+        ports = set()  # drawn late, since others take some meanwhile
+        while len(ports) < 3:
+            ports.add(vs.free_port())
+        self.port, self.lenient, self.secure = ports
         with open("/tmp/nginx/nginx.conf", "w") as file:
             file.write(CONFIGURATION % {"module": MODULE, "port": self.port,
                                         "lenient": self.lenient, "secure": self.secure,
@@ -92,7 +92,7 @@ class Nginx:
         self.process = subprocess.Popen(
             ["/usr/sbin/nginx", "-c", "/tmp/nginx/nginx.conf", "-e", "/tmp/nginx/error.log"],
             stdin=subprocess.DEVNULL)
-        for _ in range(200):
+        for _ in range(1200):
             try:
                 socket.create_connection(("127.0.0.1", self.port)).close()
                 return self
@@ -182,7 +182,7 @@ class Visitors(unittest.TestCase):
             visitor.request("GET", query, None, headers)
         visitor.get("/logged")  # the witness: behind them, and there
         text = ""
-        for _ in range(200):
+        for _ in range(1200):
             with open("/tmp/nginx/access.log") as file:
                 text = file.read()
             if "/logged" in text:

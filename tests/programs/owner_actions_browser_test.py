@@ -27,8 +27,9 @@ class Actions(OwnerTest):
         self.assert_notice("The address of “One” is copied")
         self.new_link()
         self.field("Title").send_keys(Keys.CONTROL + "v")
-        self.assertEqual(self.field("Title").get_attribute("value"),
-                         f"http://127.0.0.1:{self.server.port}/sharing/{self.link}")
+        address = f"http://127.0.0.1:{self.server.port}/sharing/{self.link}"
+        self.wait_for(lambda: self.field("Title").get_attribute("value"),
+                      lambda seen: seen == address)
 
     def test_address_is_selected_where_nothing_may_be_copied(self):
         # As on a page that came without HTTPS from another machine.
@@ -74,6 +75,7 @@ class Actions(OwnerTest):
         self.assert_cell("One", "State", "Disabled")
         self.act("One", "toggle")
         self.assert_cell("One", "State", "Live")
+        self.assert_notice("“One” is enabled. ")
         self.press("Dismiss")
         self.wait_for(self.notice, lambda seen: seen == "")
 

@@ -225,10 +225,12 @@ class Late(OwnerTest):
     def test_list_of_an_older_filter_is_dropped(self):
         self.hold("list")
         self.field("Search").send_keys("One")
-        self.wait_for(lambda: len(self.sent("list")), lambda seen: seen == 1)
+        self.wait_for(lambda: self.sent("list"),
+                      lambda seen: seen and seen[-1].get("search") == "One")
         self.field("Search").clear()
         self.field("Search").send_keys("Two")
-        self.assert_count("1 link")
+        self.wait_for(lambda: [row["Title"] for row in self.rows()],
+                      lambda seen: len(seen) == 1 and "Two" in seen[0])
         self.let_go()
         self.settle()
         self.assertIn("Two", self.rows()[0]["Title"])

@@ -165,7 +165,10 @@ class OwnerPage(browser.Browser):
         return self.row(title).find_element(By.CSS_SELECTOR, f"[data-action='{action}']")
 
     def act(self, title, action):
-        """The list may be made anew while the button is looked for."""
+        """The list may be made anew while the button is looked for; while it is pressed nobody would
+        notice."""
+        self.wait_for(lambda: self.browser.find_element(By.ID, "rows").get_attribute("aria-busy"),
+                      lambda seen: seen is None)
         self.wait_for(lambda: self.button(title, action).click(), lambda _: True)
 
     def notice(self):

@@ -191,7 +191,7 @@ TEST_F(OwnerTransaction, FileThatIsLockedForAWhileIsWaitedFor) {
 TEST_F(OwnerTransaction, FileThatStaysLockedIsBusy) {
   Entry link = Link("aaa");
   ASSERT_TRUE(EntryDB(db_).Create(link));
-  const Holder holder(13);
+  const Holder holder(17);
   const MaybeProblem problem = InTransaction(db_, [&](EntryDB& links) {
     Entry read;
     EXPECT_TRUE(links.GetById(link.get_id(), read));

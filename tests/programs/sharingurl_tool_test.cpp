@@ -441,7 +441,7 @@ bool HasSilentServer() {
 int ExpectOutputSoon() {
   const auto begin = std::chrono::steady_clock::now();
   ExpectOutput("192.0.2.9");
-  EXPECT_LE(std::chrono::steady_clock::now() - begin, std::chrono::seconds(3));
+  EXPECT_LE(std::chrono::steady_clock::now() - begin, std::chrono::seconds(8));
   return 0;
 }
 

@@ -42,7 +42,8 @@ class Pages(BrowserTest):
         self.assert_heading("Our trip to the coast")
         self.assert_rendered()
         self.picture("open")
-        self.browser.switch_to.active_element.send_keys(Keys.ENTER)  # the button has the focus
+        self.assert_focus(lambda: self.browser.find_element(By.TAG_NAME, "button"))
+        self.browser.switch_to.active_element.send_keys(Keys.ENTER)
         self.assert_file_arrives()
 
     def test_password_link(self):
@@ -140,7 +141,7 @@ class Pages(BrowserTest):
             self.assert_rendered()
             self.press("Open")
             self.assert_arrives_at(site.address)
-            self.assertEqual(self.browser.title, "Elsewhere")
+            self.wait_for(lambda: self.browser.title, lambda seen: seen == "Elsewhere")
             self.assertEqual(site.referrers, [None])
 
     def test_redirect_by_parameter_survives_the_form(self):

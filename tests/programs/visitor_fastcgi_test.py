@@ -183,11 +183,11 @@ class Process(unittest.TestCase):
         visitor = admitted(link)
         first = the_process()
         os.kill(first, 15)
-        for _ in range(200):
+        for _ in range(1200):
             if not os.path.exists(f"/proc/{first}"):
                 break
             time.sleep(0.05)
-        for _ in range(100):
+        for _ in range(1200):
             reply = visitor.get(path_of(link))
             if reply.status == 200:
                 break
@@ -199,7 +199,7 @@ class Process(unittest.TestCase):
         with vs.WebServer(vs.fastcgi_configuration("/tmp/run-of-another")) as server:
             programs = server.programs()
         self.assertGreaterEqual(len(programs), 2)
-        for _ in range(100):
+        for _ in range(1200):
             left = [pid for pid in programs if os.path.exists(f"/proc/{pid}")]
             if not left:
                 return

@@ -582,7 +582,7 @@ class Files(VisitorTest):
         for pid in (SERVER.process.pid, SERVER.programs()[0]):
             self.assertLess(peak_memory(pid), 32 * 1024)
         connection.close()
-        for _ in range(200):
+        for _ in range(1200):
             if not SERVER.programs():
                 break
             time.sleep(0.05)

@@ -108,7 +108,7 @@ class WebServer:
         self.process = subprocess.Popen(
             ["/usr/sbin/lighttpd", "-D", "-f", self.configuration],
             env=environment, stdin=subprocess.DEVNULL)
-        for _ in range(200):
+        for _ in range(1200):
             if self.process.poll() is not None:
                 return False
             try:

@@ -212,7 +212,7 @@ class Database(unittest.TestCase):
             self.assertEqual(self.answer().code, 100)
         finally:
             os.replace(vs.DATABASE + ".kept", vs.DATABASE)
-        for _ in range(100):
+        for _ in range(1200):
             answer = self.answer()
             if answer is not None and answer.ok:
                 break
@@ -224,7 +224,7 @@ class Database(unittest.TestCase):
         return ws.answer_of(reply.body) if reply.get("Content-Type") == "application/json" else None
 
     def wait_for_another(self, old):
-        for _ in range(100):
+        for _ in range(1200):
             now = processes()
             if now and old not in now:
                 return

@@ -210,7 +210,7 @@ class Bodies(HttpTest):
                            "CONTENT_LENGTH": str(announced), "REMOTE_USER": "alice"}
             ours, theirs = socket.socketpair()
             with ours, theirs:  # nothing ever comes, and no end either
-                done = subprocess.run([ws.ENTRY], stdin=theirs, env=environment, timeout=20,
+                done = subprocess.run([ws.ENTRY], stdin=theirs, env=environment, timeout=120,
                                       stdout=subprocess.PIPE, user=33, group=33, extra_groups=[])
             self.assertIn(b"Status: 413 ", done.stdout)
             self.assertIn(b'"code":110', done.stdout)
