@@ -99,6 +99,27 @@ check_files() {
 
 installed() { [ "$(dpkg-query -W -f='${db:Status-Abbrev}${Version}' "$1" 2>/dev/null)" = "ii $2" ]; }
 
+# A file that another version left behind, or that was put back from a copy before anything else.
+check_older_database() {
+  apt install sqlite3
+  mkdir -m 711 -p /usr/tuvo/etc/private/session
+  sqlite3 $session/sharing.db </project/tests/db/golden/1.sql
+  chown -R daemon:daemon $session
+  chmod 660 $session/sharing.db
+  sha256sum $session/sharing.db >"$work/older"
+  install "$packages" libtuvosharing7 libtuvoplatform1 tuvosharing
+  sha256sum --quiet --check "$work/older" || fail "the packages have touched the database"
+  check_files
+  for hash in Zk3AbcDe9 pAssw0rd1 longData1 bigNumber; do
+    tuvosharing show $hash >/dev/null || fail "the link $hash is missing"
+  done
+  [ "$(sqlite3 $session/sharing.db 'PRAGMA user_version')" = 2 ] || fail "it is of its version still"
+  purge_asking yes
+  [ ! -e /usr/tuvo ] || fail "after a yes there is left: $(find /usr/tuvo)"
+  apt purge libtuvosharing7 libtuvoplatform1 sqlite3
+  step "installed over a database of an older version: untouched, then migrated by its first use"
+}
+
 check_first_install() {
   [ ! -e /usr/tuvo ] || fail "this system is not fresh"
   install "$previous" libtuvosharing7 libtuvoplatform1 tuvosharing
@@ -398,6 +419,7 @@ check_documentation() {
   step "the guides are installed, and go"
 }
 
+check_older_database
 check_first_install
 check_web_server
 make_links
