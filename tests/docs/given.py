@@ -8,10 +8,9 @@ GIVEN = {
     # Units and configuration where the packages have them.
     "docs/packages.md": """
         cp packaging/systemd/* /etc/systemd/system/
-        mkdir /etc/tuvosharing /srv/share
+        mkdir /etc/tuvosharing
         mv /usr/tuvo/etc/tuvosharing.conf /etc/tuvosharing/
         ln -s /etc/tuvosharing/tuvosharing.conf /usr/tuvo/etc/
-        echo report >/srv/share/report.txt
         """,
     # The link that is edited.
     "docs/cli.md": "tuvosharing create --project file --path /srv/shares/report.pdf --hash abcDEF123",

@@ -241,6 +241,9 @@ check_fastcgi() {
 # What systemd's units start, under their identities and capabilities.
 check_units() {
   local unit=/lib/systemd/system/tuvosharing body
+  apt install systemd
+  systemd-analyze verify $unit-*@.socket $unit-*@.service >"$work/body" 2>&1 &&
+    [ ! -s "$work/body" ] || fail "systemd-analyze: $(cat "$work/body")"
   grep -qx 'ExecStart=/usr/tuvo/libexec/sharing.cgi' $unit-visitors@.service || fail "visitors' unit"
   setpriv --reuid=1 --regid=1 --clear-groups --no-new-privs --inh-caps=-all --bounding-set=-all \
     env -i REQUEST_METHOD=GET PATH_INFO="${password_link#/sharing}" REMOTE_ADDR=127.0.0.9 \
@@ -415,6 +418,10 @@ check_documentation() {
     reference/md_result_codes.html reference/classTUVO_1_1sharing_1_1record_1_1Entry.html; do
     [ -s "/usr/share/doc/tuvosharing/$guide" ] || fail "$guide is missing"
   done
+  grep -o '](\([^)#:]*\))' /usr/share/doc/tuvosharing/README.md | sed 's/](\(.*\))/\1/' | sort -u |
+    while read -r guide; do
+      [ -e "/usr/share/doc/tuvosharing/$guide" ] || fail "README.md leads to $guide, which is missing"
+    done
   apt purge tuvosharing-doc
   step "the guides are installed, and go"
 }

@@ -90,6 +90,15 @@ diff <(printf '%s\n' "${headers[@]}") \
   <(cd /project && find include/tuvosharing platform/include/tuvoplatform -type f |
     sed 's|.*include/||' | sort) || fail "the packaged headers are not the public ones"
 read -ra flags <<<"$(pkg-config --cflags tuvosharing tuvoplatform)"
+# From a copy: compilers do not warn of what is in the system's folders.
+mkdir copy
+cp -r /usr/include/tuvosharing /usr/include/tuvoplatform copy
+flags+=("-I$PWD/copy")
+echo 'inline int Narrow(long wide) { return wide; }' >copy/faulty.h
+for compiler in g++ clang++; do
+  ! $compiler -fsyntax-only "${warnings[@]}" "${flags[@]}" -x c++ - <<<'#include <faulty.h>' 2>/dev/null ||
+    fail "$compiler has nothing to say about a faulty header"
+done
 # shellcheck disable=SC2016 # the inner shell's arguments
 printf '%s\n' "${headers[@]}" | xargs -P "$(nproc)" -I{} bash -eu -c '
   header=$1
@@ -104,7 +113,7 @@ printf '%s\n' "${headers[@]}" | xargs -P "$(nproc)" -I{} bash -eu -c '
 step "${#headers[@]} headers, each alone, in C++17 and C++20, by g++ and clang++, without a warning"
 for compiler in gcc clang; do
   for standard in c99 c11; do
-    $compiler -std=$standard -fsyntax-only "${warnings[@]}" -x c - <<<'#include <tuvosharing/login.h>' ||
+    $compiler -std=$standard -fsyntax-only "${warnings[@]}" "-I$PWD/copy" -x c - <<<'#include <tuvosharing/login.h>' ||
       fail "login.h, $compiler, $standard"
   done
 done
