@@ -94,7 +94,7 @@ read -ra flags <<<"$(pkg-config --cflags tuvosharing tuvoplatform)"
 mkdir copy
 cp -r /usr/include/tuvosharing /usr/include/tuvoplatform copy
 flags+=("-I$PWD/copy")
-echo 'inline int Narrow(long wide) { return wide; }' >copy/faulty.h
+echo 'inline int Narrow(long long wide) { return wide; }' >copy/faulty.h
 for compiler in g++ clang++; do
   ! $compiler -fsyntax-only "${warnings[@]}" "${flags[@]}" -x c++ - <<<'#include <faulty.h>' 2>/dev/null ||
     fail "$compiler has nothing to say about a faulty header"
