@@ -20,6 +20,7 @@
 
 #include "concurrency/board.h"
 #include "concurrency/crew.h"
+#include "concurrency/tally.h"
 #include "concurrency/visitors.h"
 #include "concurrency/worker.h"
 #include "db/sqlite_file.h"
@@ -56,14 +57,15 @@ Rows RowsOf(SqliteFile& file, const std::string& sql) {
   return {rows.begin(), rows.end()};
 }
 
-// Empty when both are the same; else a few of the differences.
-std::string Difference(const Rows& wanted, const Rows& found) {
+// Empty when both are the same; else a few of the differences. Adds to `lost_rows` what is missing.
+std::string Difference(const Rows& wanted, const Rows& found, long* lost_rows) {
   std::vector<TextRow> lost;
   std::vector<TextRow> extra;
   std::set_difference(wanted.begin(), wanted.end(), found.begin(), found.end(),
                       std::back_inserter(lost));
   std::set_difference(found.begin(), found.end(), wanted.begin(), wanted.end(),
                       std::back_inserter(extra));
+  *lost_rows += static_cast<long>(lost.size());
   std::string text;
   for (const auto& [name, rows] : {std::pair("lost", lost), std::pair("extra", extra)}) {
     for (std::size_t i = 0; i < rows.size() && i < 5; ++i) {
@@ -211,7 +213,7 @@ class ManyProcesses : public testing::Test {
   }
 
   // Links by hash, id, title and uses, those apart that may be collected.
-  void ExpectLinks(SqliteFile& file) const {
+  void ExpectLinks(SqliteFile& file) {
     Rows wanted;
     for (const PublicLink& link : board_->link) {
       wanted.insert({link.hash.data(), Title(link.title), std::to_string(link.uses)});
@@ -228,13 +230,13 @@ class ManyProcesses : public testing::Test {
         RowsOf(file,
                "SELECT hash, json_extract(data, '$.protect_title'), use_count FROM entry "
                "WHERE auto_gc = 0");
-    EXPECT_EQ("", Difference(wanted, found));
+    EXPECT_EQ("", Difference(wanted, found, &tally_.lost_rows));
     EXPECT_EQ(kLimit, board_->link[kLimitedLink].uses) << "what comes behind the limit was not met";
   }
 
   static std::string Title(int title) { return title == 0 ? "" : std::to_string(title); }
 
-  void ExpectSessionsAndTokens(SqliteFile& file) const {
+  void ExpectSessionsAndTokens(SqliteFile& file) {
     Rows sessions;
     Rows tokens;
     for (const Worker& worker : board_->worker) {
@@ -248,13 +250,13 @@ class ManyProcesses : public testing::Test {
         }
       }
     }
-    EXPECT_EQ("", Difference(sessions, RowsOf(file,
-                                              "SELECT session_id FROM session "
-                                              "WHERE ip != '192.0.2.99'")));
-    EXPECT_EQ("", Difference(tokens, RowsOf(file,
-                                            "SELECT session.session_id, hash FROM token, session, "
-                                            "entry WHERE session.id = token.session_id AND "
-                                            "entry.id = entry_id")));
+    const Rows found_sessions =
+        RowsOf(file, "SELECT session_id FROM session WHERE ip != '192.0.2.99'");
+    EXPECT_EQ("", Difference(sessions, found_sessions, &tally_.lost_rows));
+    const Rows found_tokens = RowsOf(file,
+                                     "SELECT session.session_id, hash FROM token, session, entry "
+                                     "WHERE session.id = token.session_id AND entry.id = entry_id");
+    EXPECT_EQ("", Difference(tokens, found_tokens, &tally_.lost_rows));
     EXPECT_EQ(std::to_string(tokens.size()), file.Value("SELECT COUNT(*) FROM token"));
   }
 
@@ -281,7 +283,18 @@ class ManyProcesses : public testing::Test {
     }
   }
 
+  // How often all of it was admitted, counted and refused, and what is missing.
+  void TellTally() {
+    for (int kind = kLogin; kind < kClosing; ++kind) {
+      tally_.requests += board_->figure[static_cast<std::size_t>(kind)].calls;
+    }
+    tally_.failures = board_->complaints;
+    tally_.over_admissions = std::max(0, board_->link[kLimitedLink].uses - kLimit);
+    tuvo_test::Tell(tally_);
+  }
+
   SyslogListener syslog_;
+  Tally tally_{};
   Shared<Board> board_;
   std::uintmax_t largest_log_ = 0;
   int pauses_ = 0;
@@ -301,6 +314,7 @@ TEST_F(ManyProcesses, LoseNothingAndNeverFail) {
   ExpectWhole(file);
   ExpectLinks(file);
   ExpectSessionsAndTokens(file);
+  TellTally();
 }
 
 }  // namespace

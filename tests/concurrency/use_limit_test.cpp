@@ -16,6 +16,7 @@
 
 #include "concurrency/crew.h"
 #include "concurrency/figure.h"
+#include "concurrency/tally.h"
 #include "concurrency/visitors.h"
 #include "db/sqlite_file.h"
 #include "support/syslog_listener.h"
@@ -121,15 +122,16 @@ class UseLimit : public Limit {
   }
 
   // Nobody gets another answer than these.
-  static void ExpectOnly(Answers answers, const std::vector<int>& allowed) {
+  void ExpectOnly(Answers answers, const std::vector<int>& allowed) {
     int sum = 0;
     for (const int answer : allowed) {
       sum += answers[answer];
     }
     EXPECT_EQ(kVisitors, sum);
+    tally_.failures += kVisitors - sum;
   }
 
-  static void ExpectAdmitted(const Answers& answers, const Round& round) {
+  void ExpectAdmitted(const Answers& answers, const Round& round) {
     const int admitted = answers.count(kGetsIn) == 0 ? 0 : answers.at(kGetsIn);
     switch (round.owner) {
       case kSwitchesOff:
@@ -145,10 +147,16 @@ class UseLimit : public Limit {
         ExpectOnly(answers, {kGetsIn, kUsedUp});
         EXPECT_EQ(std::min(round.limit, kVisitors), admitted);
     }
+    tally_.requests += kVisitors;
+    tally_.over_admissions += std::max(0, admitted - LimitInTheEnd(round));
+  }
+
+  static int LimitInTheEnd(const Round& round) {
+    return round.owner == kRaisesTheLimit ? round.limit + 3 : round.limit;
   }
 
   // What the link's row says in the end: as many uses as admissions, and what the owner wrote.
-  static void ExpectRow(const std::string& hash, const Round& round, int admitted) {
+  void ExpectRow(const std::string& hash, const Round& round, int admitted) {
     SqliteFile file(kSharingFile);
     const TextRow row =
         file.Rows(
@@ -156,14 +164,16 @@ class UseLimit : public Limit {
                 "FROM entry WHERE hash = '" +
                 hash + "'")
             .at(0);
-    const int limit = round.owner == kRaisesTheLimit ? round.limit + 3 : round.limit;
-    const TextRow wanted{std::to_string(admitted), std::to_string(limit),
+    const TextRow wanted{std::to_string(admitted), std::to_string(LimitInTheEnd(round)),
                          round.owner == kSwitchesOff ? "0" : "1",
                          round.owner == kRenames ? "new title" : ""};
     EXPECT_EQ(wanted, row);
+    tally_.lost_rows += wanted == row ? 0 : 1;
     const std::string of_the_link =
         " FROM token, entry WHERE entry_id = entry.id AND hash = '" + hash + "'";
-    EXPECT_EQ(std::to_string(admitted), file.Value("SELECT COUNT(*)" + of_the_link));
+    const int tokens = std::stoi(file.Value("SELECT COUNT(*)" + of_the_link));
+    EXPECT_EQ(admitted, tokens);
+    tally_.lost_rows += std::max(0, admitted - tokens);
     EXPECT_EQ(std::to_string(admitted),
               file.Value("SELECT COUNT(DISTINCT token.session_id)" + of_the_link));
   }
@@ -188,6 +198,7 @@ class UseLimit : public Limit {
 
  protected:
   Shared<Figure> logins_;
+  Tally tally_{};
 };
 
 class UseCount : public Limit {};
@@ -209,6 +220,7 @@ TEST_F(UseLimit, AdmitsExactlyAsManyAsItSays) {
   EXPECT_EQ(all_admitted, Number("SELECT COUNT(*) FROM session"));  // none for who was refused
   std::printf("%ld rounds, %d admitted\n", rounds, all_admitted);
   Tell("login", *logins_);
+  Tell(tally_);
 }
 
 // The same visitors one after another: what is decided twice must not be counted twice.

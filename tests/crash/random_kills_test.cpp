@@ -7,6 +7,7 @@
 #include <gtest/gtest.h>
 #include <tuvosharing/entry.h>
 
+#include <algorithm>
 #include <chrono>
 #include <csignal>
 #include <cstdio>
@@ -20,6 +21,7 @@
 #include <vector>
 
 #include "concurrency/crew.h"
+#include "concurrency/tally.h"
 #include "concurrency/visitors.h"
 #include "crash/stored.h"
 #include "crash/writers.h"
@@ -36,8 +38,8 @@ constexpr int kRoundsOfAFile = 20;
 constexpr int kMostCalls = 60;  // of a round, by all writers, before the first is killed
 
 // What the rounds together met.
-struct Tally {
-  long killed, killed_within, calls, links, visits, uses_between;
+struct Met {
+  long killed_within, links, visits, uses_between;
 };
 
 class RandomKills : public testing::Test {
@@ -98,10 +100,11 @@ class RandomKills : public testing::Test {
     for (std::size_t i = 0; i < pids.size(); ++i) {
       const int status = Wait(pids[i]);
       EXPECT_TRUE(status == 0 || status == 256 + SIGKILL) << status;
-      tally_.killed += status == 0 ? 0 : 1;
-      tally_.killed_within += Rec().writer[i].doing == kNothing ? 0 : 1;
+      tally_.kills += status == 0 ? 0 : 1;
+      met_.killed_within += Rec().writer[i].doing == kNothing ? 0 : 1;
     }
-    tally_.calls += Rec().calls - calls;
+    tally_.requests += Rec().calls - calls;
+    tally_.failures += Rec().failed_calls;
     EXPECT_EQ(0, Rec().failed_calls) << Rec().failure.data();
     Rec().failed_calls = 0;
   }
@@ -148,7 +151,9 @@ class RandomKills : public testing::Test {
     EXPECT_LE(admitted + lost_uses_, uses);
     EXPECT_GE(admitted + lost_uses_ + under_way, uses);
     EXPECT_GE(kUseLimit, uses);
-    tally_.uses_between += uses - admitted - lost_uses_;
+    tally_.lost_rows += std::max(0, admitted + lost_uses_ - uses);
+    tally_.over_admissions += std::max(0, std::max(uses, admitted) - kUseLimit);
+    met_.uses_between += uses - admitted - lost_uses_;
     lost_uses_ = uses - admitted;
   }
 
@@ -177,6 +182,7 @@ class RandomKills : public testing::Test {
     const bool there = found != links_.end();
     if (doing != kDeleting) {
       EXPECT_EQ(link.there, there) << link.hash.data();
+      tally_.lost_rows += link.there && !there ? 1 : 0;
     } else {
       EXPECT_TRUE(link.there || !there);
     }
@@ -184,12 +190,13 @@ class RandomKills : public testing::Test {
     if (!there) {
       return;
     }
-    ++tally_.links;
+    ++met_.links;
     const int generation = GenerationOf(found->second);
     EXPECT_LE(link.generation, generation);
     EXPECT_GE(link.generation + (doing == kChanging ? 1 : 0), generation);
     const int uses = found->second.get_use_count();
     EXPECT_LE(link.uses, uses);
+    tally_.lost_rows += link.generation > generation || link.uses > uses ? 1 : 0;
     EXPECT_GE(link.uses + (doing == kCounting || doing == kVisiting ? 1 : 0), uses);
     link.generation = generation;
     link.uses = uses;
@@ -228,8 +235,9 @@ class RandomKills : public testing::Test {
       EXPECT_TRUE(visit.inside || !inside);
     } else {
       EXPECT_EQ(visit.inside, inside) << visit.session.data();
+      tally_.lost_rows += visit.inside && !inside ? 1 : 0;
     }
-    tally_.visits += inside ? 1 : 0;
+    met_.visits += inside ? 1 : 0;
     visit.inside = inside;
   }
 
@@ -239,6 +247,7 @@ class RandomKills : public testing::Test {
   std::set<std::pair<std::string, std::string>> inside_;
   int lost_uses_ = 0;  // counted for visitors who were never told that they are in
   Tally tally_{};
+  Met met_{};
 };
 
 TEST_F(RandomKills, LoseNothingThatWasAcknowledged) {
@@ -256,9 +265,10 @@ TEST_F(RandomKills, LoseNothingThatWasAcknowledged) {
   std::printf(
       "%ld rounds: %ld calls; %ld writers killed, %ld of them within a call; seen again after a "
       "round: %ld links, %ld visitors inside; %ld uses counted for visitors who were not told\n",
-      round, tally_.calls, tally_.killed, tally_.killed_within, tally_.links, tally_.visits,
-      tally_.uses_between);
-  EXPECT_LT(0, tally_.killed_within);
+      round, tally_.requests, tally_.kills, met_.killed_within, met_.links, met_.visits,
+      met_.uses_between);
+  Tell(tally_);
+  EXPECT_LT(0, met_.killed_within);
 }
 
 }  // namespace
