@@ -2,8 +2,8 @@
 
 from programs import FLOOR, LIBRARY
 
-HEAD = ("row", "links", "library [min-max]", "floor [min-max]", "wall", "CPU library", "CPU floor",
-        "CPU", "instructions", "fsyncs", "peak MiB", "target", "")
+HEAD = ("row", "links", "library [min-max]", "floor [min-max]", "wall [min-max]", "CPU library", "CPU floor",
+        "CPU [min-max]", "instructions", "fsyncs", "peak MiB", "target", "")
 
 
 def _time(seconds):
@@ -16,6 +16,10 @@ def _time(seconds):
 
 def _spread(values):
     return f"{_time(values['median'])} [{_time(values['min'])}-{_time(values['max'])}]"
+
+
+def _ratio(values):
+    return f"{values['median']:.2f} [{values['min']:.2f}-{values['max']:.2f}]"
 
 
 def _links(result):
@@ -46,8 +50,8 @@ def _cells(result):
                 "", "", "", "", *_verdict(result["targets"]))
     library, floor = result[LIBRARY], result[FLOOR]
     return (result["row"], _links(result), _spread(library["wall"]), _spread(floor["wall"]),
-            f"{result['wall_ratio']['median']:.2f}", _time(library["cpu"]["median"]),
-            _time(floor["cpu"]["median"]), f"{result['cpu_ratio']['median']:.2f}",
+            _ratio(result["wall_ratio"]), _time(library["cpu"]["median"]),
+            _time(floor["cpu"]["median"]), _ratio(result["cpu_ratio"]),
             _instructions(result.get("instructions")),
             _both(result.get("fsyncs"), lambda count: f"{count:g}"),
             f"{library['peak_kib']['median'] / 1024:.1f} / {floor['peak_kib']['median'] / 1024:.1f}",

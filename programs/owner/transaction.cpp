@@ -34,6 +34,9 @@ class OpenTransaction {
 
   bool IsOpen() const { return open_; }
   bool Commit() {
+    // BaseDB's own Commit takes back by itself what it could not commit, and whether that went well
+    // is what the connection remembers then; here the reason of the first failure is still to be
+    // asked for.
     open_ = !db_.Execute("COMMIT");
     return !open_;
   }

@@ -1,7 +1,7 @@
 # shellcheck shell=bash
-# To be sourced. install_axe: puts axe-core, the accessibility checker that the browser tests load
+# To be sourced, after packages.sh. install_axe: puts axe-core, the accessibility checker that the browser tests load
 # into the pages, under build/tools, unless it is there already. It is in no package of Debian's, so
-# it comes through npm where the machine has that, from the registry that npm is configured with. Where
+# it comes through npm, which is installed for that, from the registry that npm is configured with. Where
 # it cannot be had, or is not the file that it was when this was written, this says why and returns
 # 1; the tests that need it are skipped then. It is used by tests alone: nothing of it is built,
 # installed or handed out.
@@ -23,6 +23,10 @@ install_axe() {
   if [ -s "$tuvo_axe" ]; then
     is_axe_genuine
     return
+  fi
+  # Many packages, which nothing else here needs.
+  if ! command -v npm >/dev/null && [ "$(id -u)" -eq 0 ]; then
+    tuvo_apt_install npm || true
   fi
   if ! command -v npm >/dev/null; then
     echo "No accessibility tests: npm, which would fetch axe-core, is not on this machine" >&2

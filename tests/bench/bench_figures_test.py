@@ -80,7 +80,8 @@ def figures(cpu, grown_kib=0.0, kept_kib=0.0):
 
 
 def result(row, library, floor):
-    ratio = {"median": library["cpu"]["median"] / floor["cpu"]["median"]}
+    ratio = library["cpu"]["median"] / floor["cpu"]["median"]
+    ratio = {"median": ratio, "min": ratio, "max": ratio}
     return {"row": row.name, "operation": row.operation, "links": row.links, "expired": 0,
             "library": library, "floor": floor, "wall_ratio": ratio, "cpu_ratio": ratio}
 

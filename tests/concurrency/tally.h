@@ -5,10 +5,10 @@
 namespace tuvo_test {
 
 struct Tally {
-  long requests;         // calls of the public interface
-  long failures;         // of them answered what nothing explains
-  long lost_rows;        // acknowledged, and not there as they were acknowledged
-  long kills;            // processes that were killed
+  long requests;   // of the public interface; some are several calls
+  long failures;   // of them answered what nothing explains
+  long lost_rows;  // acknowledged, and not as they were acknowledged: gone, older, or there again
+  long kills;      // processes that were killed
   long over_admissions;  // beyond a link's limit of uses
 };
 

@@ -42,7 +42,8 @@ class Process {
       : board_(board),
         number_(number),
         worker_(board.worker[static_cast<std::size_t>(number)]),
-        random_(static_cast<unsigned int>(number + kWorkers * worker_.served)) {}
+        random_(static_cast<unsigned int>(FromEnvironment("TUVO_SEED", 0)) * 1000003U +
+                static_cast<unsigned int>(number + kWorkers * worker_.served)) {}
 
   void Serve() {
     std::atexit([] { closing.reset(); });  // runs behind the closing of the database

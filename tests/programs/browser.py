@@ -1,6 +1,7 @@
 """A real browser for the tests of the pages: Chromium in a profile of its own, driven through its
-driver. With TUVO_SCREENSHOTS set to a folder, pictures of pages are left there. To be imported in a
-test program, which it ends as skipped where there is no browser."""
+driver. Pictures of the pages are left in the build's Testing/pictures, or in the folder that
+TUVO_SCREENSHOTS names. To be imported in a test program, which it ends as skipped where there is no
+browser."""
 
 import atexit
 import json
@@ -217,9 +218,8 @@ class Browser:
         self.browser.find_element(By.XPATH, f"//button[.='{button}']").click()
 
     def picture(self, name):
-        folder = os.environ.get("TUVO_SCREENSHOTS")
-        if folder:
-            self.browser.save_screenshot(os.path.join(folder, name + ".png"))
+        os.makedirs(_Result.folder, exist_ok=True)
+        self.browser.save_screenshot(os.path.join(_Result.folder, name + ".png"))
 
     def downloaded(self):
         """Name and content of the file that the browser was sent."""

@@ -8,7 +8,7 @@ import unittest
 import owner_page
 import visitor_server as vs
 from browser import By
-from owner_page import FOLDER, PHONE, WIDE, ZOOMED, OwnerTest, make_link, make_links
+from owner_page import FILE, FOLDER, PHONE, WIDE, ZOOMED, OwnerTest, make_link, make_links
 
 SCREENS = ("phone", PHONE), ("zoomed", ZOOMED), ("wide", WIDE)
 
@@ -52,6 +52,15 @@ class Look(OwnerTest):
         self.picture("owner-form")
         self.press_in("link", "Cancel")
         self.assert_no_dialog()
+        self.set_size(560, 620)
+        self.act("The summer report", "qr")
+        self.dialog("address")
+        self.wait_for(lambda: self.browser.find_elements(By.CSS_SELECTOR, "#address-dialog svg, "
+                                                         "#address-dialog img"),
+                      lambda seen: seen and seen[0].is_displayed())
+        self.picture("owner-qr")
+        self.press_in("address", "Close")
+        self.assert_no_dialog()
         self.set_scheme("dark")
         self.set_size(360, 800)
         self.picture("owner-phone")
@@ -60,6 +69,33 @@ class Look(OwnerTest):
         vs.sql("UPDATE entry SET hash='summer' WHERE data LIKE '%summer.pdf%'")
         self.go(f"http://127.0.0.1:{self.server.port}/sharing/summer")
         self.picture("visitor-login")
+        self.pictures_of_visitors_pages()
+
+    def pictures_of_visitors_pages(self):
+        """Those without a password."""
+        link = vs.make_file_link(FOLDER + "/pictures/coast.zip", protect_title="Our trip to the coast")
+        accounts = vs.make_file_link(FOLDER + "/reports/summer.pdf", protect_type="user",
+                                     protect_title="The summer report", protect_users=["alice"])
+        used_up = vs.make_file_link(FILE, expire_times=1, use_count=1)
+        album = vs.make_link(project_name="album", protect_title="Our trip to the coast")
+        for name, path, heading in (
+                ("visitor-open", link, "Our trip to the coast"),
+                ("visitor-account", accounts, "The summer report"),
+                ("visitor-used-up", used_up, "This link is used up"),
+                ("visitor-unknown", "nosuchlink", "This link does not open")):
+            self.go(f"http://127.0.0.1:{self.server.port}/sharing/{path}")
+            self.assert_heading(heading)
+            self.picture(name)
+        self.go(f"http://127.0.0.1:{self.server.port}/sharing/{album}")
+        self.press("Open")
+        self.assert_heading("The link is open")
+        self.picture("visitor-other-application")
+        self.browser.find_element(By.LINK_TEXT, "Log out of this link").click()
+        self.assert_heading("Log out of this link?")
+        self.picture("visitor-logout")
+        self.press("Log out")
+        self.assert_heading("You are logged out")
+        self.picture("visitor-logged-out")
 
     def fits_everywhere(self, name):
         """A dialog that is open, on every kind of screen."""
