@@ -95,6 +95,20 @@ class Changes(ChangesTest):
         self.change(enabled=True)
         self.assert_visit(200)  # the admission was not taken away
 
+    def test_link_whose_begin_is_put_off(self):
+        self.change(start_at="+1h")
+        self.assert_visit(404)
+        self.change(start_at="")
+        self.assert_visit(200)
+
+    def test_another_file_is_what_they_get(self):
+        other = FILE + ".other"
+        with open(other, "wb") as file:
+            file.write(b"of another file")
+        self.change(app={"path": other})
+        reply = self.visitor.get(self.path)
+        self.assertEqual((reply.status, reply.body), (200, b"of another file"))
+
     def test_link_that_has_expired(self):
         sql("UPDATE entry SET expire_at = ? WHERE hash = ?", int(time.time()) - 1, self.link)
         self.assert_visit(404)

@@ -104,7 +104,7 @@ TEST_F(EveryLoginCall, ToALinkWithALimitIsCountedOrLogged) {
     int admitted_uncounted = 0;
     std::string session_id;
     Sweep(
-        "login, link with a limit", kFiles, [&] { return LogIn(visit, session_id); },
+        "login, link with a limit", kCalls, [&] { return LogIn(visit, session_id); },
         [&](const Step& step) {
           const long uses = observer.Number("SELECT use_count FROM entry");
           if (step.answer == 1 && uses == 0) {
