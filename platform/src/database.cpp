@@ -13,6 +13,7 @@
 #include "database_result.h"
 #include "database_statement.h"
 #include "database_wait.h"
+#include "log_restart.h"
 
 namespace {
 
@@ -77,6 +78,7 @@ TUVODB* TUVODBConnect(const char* /*host*/, const char* /*user*/, const char* /*
     return nullptr;
   }
   tuvo_platform::WatchLog(connection.get());
+  tuvo_platform::WatchLogRestarts(connection->sqlite);
   return connection.release();
 }
 
