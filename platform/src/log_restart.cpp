@@ -1,7 +1,6 @@
 #include "log_restart.h"
 
 #include <array>
-#include <cstring>
 
 namespace tuvo_platform {
 
