@@ -10,7 +10,7 @@ import sys
 
 import cli_program
 from cli_program import (COLUMNS, DONE, FOLDER, TAKEN, USAGE, CliTest, create, many_links, run,
-                         show, Terminal)
+                         show, end_by_signal)
 from visitor_server import DATABASE, sql
 
 
@@ -99,15 +99,8 @@ while True:
         many_links(100)
         sql("UPDATE entry SET data = data || CAST(zeroblob(500000) AS TEXT)")  # 50 MB
         before = sorted(os.listdir("/tmp"))
-        for _ in range(20):  # it may be through before the signal comes
-            terminal = Terminal("backup", self.FILE)
-            terminal.expect(b"pages copied: ")
-            os.kill(terminal.pid, signal.SIGINT)
-            status = terminal.end()
-            if status != DONE:
-                break
-            os.unlink(self.FILE)
-        self.assertEqual(status, -signal.SIGINT)
+        self.assertEqual(end_by_signal(signal.SIGINT, b"pages copied: ", "backup", self.FILE,
+                                       take_back=lambda: os.unlink(self.FILE)), -signal.SIGINT)
         self.assertEqual(sorted(os.listdir("/tmp")), before)
         self.assertEqual([name for name in os.listdir(FOLDER) if "backup" in name], [])
 

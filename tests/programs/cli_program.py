@@ -119,6 +119,21 @@ class Terminal:
         return bool(piece)
 
 
+def end_by_signal(number, shown, *arguments, take_back):
+    """The status of a command that is sent the signal once it has shown that, at a terminal. It may be
+    through before the signal comes: what it did is taken back then, and it is tried again."""
+    status = DONE
+    for _ in range(20):
+        terminal = Terminal(*arguments)
+        terminal.expect(shown)
+        os.kill(terminal.pid, number)
+        status = terminal.end()
+        if status != DONE:
+            break
+        take_back()
+    return status
+
+
 class CliTest(unittest.TestCase):
     def setUp(self):
         if os.path.exists(DATABASE):

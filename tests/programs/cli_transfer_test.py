@@ -13,7 +13,7 @@ import time
 import cli_program
 import visitor_server as vs
 from cli_program import (COLUMNS, DAMAGE, DONE, TAKEN, USAGE, CliTest, create, many_links, run,
-                         show, Terminal)
+                         show, end_by_signal)
 from visitor_server import DATABASE, SYSTEM, sql
 
 
@@ -249,16 +249,10 @@ for i in range(300):
     def test_an_interrupted_import_leaves_nothing(self):
         many_links(20000)
         self.assertEqual(run("export", self.FILE).returncode, DONE)
-        for _ in range(20):  # it may be through before the signal comes
-            sql("DELETE FROM entry")
-            terminal = Terminal("import", self.FILE)
-            terminal.expect(b"imported: ")
-            terminal.expect(b"of 20000")
-            os.kill(terminal.pid, signal.SIGINT)
-            status = terminal.end()
-            if status != DONE:
-                break
-        self.assertEqual(status, -signal.SIGINT)
+        sql("DELETE FROM entry")
+        self.assertEqual(end_by_signal(signal.SIGINT, b"of 20000", "import", self.FILE,
+                                       take_back=lambda: sql("DELETE FROM entry")),
+                         -signal.SIGINT)
         self.assertEqual(sql("SELECT * FROM entry"), [])
         self.assertEqual(sql("PRAGMA integrity_check"), [("ok",)])
 
@@ -266,15 +260,8 @@ for i in range(300):
         create()
         many_links(60000)
         before = sorted(os.listdir("/tmp"))
-        for _ in range(20):  # it may be through before the signal comes
-            terminal = Terminal("export", self.FILE)
-            terminal.expect(b"exported: ")
-            os.kill(terminal.pid, signal.SIGTERM)
-            status = terminal.end()
-            if status != DONE:
-                break
-            os.unlink(self.FILE)
-        self.assertEqual(status, -signal.SIGTERM)
+        self.assertEqual(end_by_signal(signal.SIGTERM, b"exported: ", "export", self.FILE,
+                                       take_back=lambda: os.unlink(self.FILE)), -signal.SIGTERM)
         self.assertEqual(sorted(os.listdir("/tmp")), before)
 
 
